@@ -1,0 +1,7 @@
+#include "kelbaselib/Bytesink.h"
+
+namespace kelbaselib {
+
+Bytesink::~Bytesink() = default;
+
+}  // namespace kelbaselib

@@ -1,0 +1,21 @@
+#pragma once
+
+namespace kelbaselib {
+
+/// Takes bytes. A sink belongs to one thread at a time.
+class Bytesink {
+ public:
+    /// Takes `count` bytes and gives how many were taken: fewer than `count` means that the sink is full or
+    /// broken.
+    virtual unsigned Write(const void* bytes, unsigned count) = 0;
+
+    Bytesink(const Bytesink&) = delete;
+    Bytesink& operator=(const Bytesink&) = delete;
+
+ protected:
+    Bytesink() = default;
+    // Behind Write, which is the first in the table of virtual operations.
+    virtual ~Bytesink();
+};
+
+}  // namespace kelbaselib

@@ -1,0 +1,7 @@
+#include "kelbaselib/Bytesource.h"
+
+namespace kelbaselib {
+
+Bytesource::~Bytesource() = default;
+
+}  // namespace kelbaselib
