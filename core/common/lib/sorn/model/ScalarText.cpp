@@ -1,0 +1,192 @@
+#include "sorn/model/ScalarText.h"
+
+#include <cstring>
+#include <ctime>
+#include <limits>
+
+namespace sorn::scalartext {
+
+namespace {
+
+constexpr int64_t secondsPerDayG = 86400;
+
+bool FDigit(char c) {
+    return c >= '0' && c <= '9';
+}
+
+/// A civil date of the proleptic Gregorian calendar.
+struct CivilDate {
+    int64_t year;
+    int month;  // 1 to 12
+    int day;    // 1 to 31
+};
+
+// Both conversions count in eras of 400 years that begin on 1 March, after H. Hinnant, "chrono-Compatible
+// Low-Level Date Algorithms".
+CivilDate DateOfDays(int64_t days) {
+    days += 719468;
+    const int64_t era = (days >= 0 ? days : days - 146096) / 146097;
+    const int64_t dayOfEra = days - era * 146097;
+    const int64_t yearOfEra = (dayOfEra - dayOfEra / 1460 + dayOfEra / 36524 - dayOfEra / 146096) / 365;
+    const int64_t dayOfYear = dayOfEra - (365 * yearOfEra + yearOfEra / 4 - yearOfEra / 100);
+    const int64_t shiftedMonth = (5 * dayOfYear + 2) / 153;
+    const int month = static_cast<int>(shiftedMonth < 10 ? shiftedMonth + 3 : shiftedMonth - 9);
+    return {yearOfEra + era * 400 + (month <= 2 ? 1 : 0), month,
+            static_cast<int>(dayOfYear - (153 * shiftedMonth + 2) / 5 + 1)};
+}
+
+int64_t DaysOfDate(int64_t year, int month, int day) {
+    year -= month <= 2 ? 1 : 0;
+    const int64_t era = (year >= 0 ? year : year - 399) / 400;
+    const int64_t yearOfEra = year - era * 400;
+    const int64_t dayOfYear = (153 * (month > 2 ? month - 3 : month + 9) + 2) / 5 + day - 1;
+    return era * 146097 + yearOfEra * 365 + yearOfEra / 4 - yearOfEra / 100 + dayOfYear - 719468;
+}
+
+char* WriteTwoDigits(int64_t value, char* out) {
+    out[0] = static_cast<char>('0' + value / 10);
+    out[1] = static_cast<char>('0' + value % 10);
+    return out + 2;
+}
+
+char* WriteDate(int64_t days, char* out) {
+    const CivilDate date = DateOfDays(days);
+    out = WriteDecimal(date.year, out);  // "%Y" does not pad
+    *out++ = '-';
+    out = WriteTwoDigits(date.month, out);
+    *out++ = '-';
+    return WriteTwoDigits(date.day, out);
+}
+
+char* WriteTime(int64_t secondOfDay, char* out) {
+    out = WriteTwoDigits(secondOfDay / 3600, out);
+    *out++ = ':';
+    out = WriteTwoDigits(secondOfDay / 60 % 60, out);
+    *out++ = ':';
+    return WriteTwoDigits(secondOfDay % 60, out);
+}
+
+/// Reads n digits at fixed places; false when one is no digit or the number lies outside low to high.
+bool ReadFixed(const char* p, int n, int low, int high, int& value) {
+    value = 0;
+    for (int i = 0; i < n; ++i) {
+        if (!FDigit(p[i])) return false;
+        value = value * 10 + (p[i] - '0');
+    }
+    return value >= low && value <= high;
+}
+
+bool ReadCanonicalDate(const char* p, std::tm& parts) {
+    int year = 0;
+    int month = 0;
+    if (!ReadFixed(p, 4, 0, 9999, year) || p[4] != '-' || !ReadFixed(p + 5, 2, 1, 12, month) || p[7] != '-' ||
+        !ReadFixed(p + 8, 2, 1, 31, parts.tm_mday)) {
+        return false;
+    }
+    parts.tm_year = year - 1900;
+    parts.tm_mon = month - 1;
+    return true;
+}
+
+bool ReadCanonicalTime(const char* p, std::tm& parts) {
+    return ReadFixed(p, 2, 0, 23, parts.tm_hour) && p[2] == ':' && ReadFixed(p + 3, 2, 0, 59, parts.tm_min) &&
+           p[5] == ':' && ReadFixed(p + 6, 2, 0, 59, parts.tm_sec);
+}
+
+/// The texts that the writers make, read without strptime; it takes them to the same parts.
+bool ReadCanonical(const char* text, unsigned nByte, MomentParts wanted, std::tm& parts) {
+    switch (wanted) {
+        case DATE_ONLY:
+            return nByte == 10 && ReadCanonicalDate(text, parts);
+        case TIME_ONLY:
+            return nByte == 8 && ReadCanonicalTime(text, parts);
+        case DATE_AND_TIME:
+            return nByte == 19 && (text[10] == ' ' || text[10] == 'T') && ReadCanonicalDate(text, parts) &&
+                   ReadCanonicalTime(text + 11, parts);
+    }
+    return false;
+}
+
+bool ReadWhole(const char* text, unsigned nByte, const char* format, std::tm& parts) {
+    const char* const stop = ::strptime(text, format, &parts);
+    return stop != nullptr && stop == text + nByte;
+}
+
+bool ReadGeneral(const char* text, unsigned nByte, MomentParts wanted, std::tm& parts) {
+    switch (wanted) {
+        case DATE_ONLY:
+            return ReadWhole(text, nByte, "%F", parts);
+        case TIME_ONLY:
+            return ReadWhole(text, nByte, "%T", parts);
+        case DATE_AND_TIME:
+            return ReadWhole(text, nByte, "%F %T", parts) || ReadWhole(text, nByte, "%FT%T", parts);
+    }
+    return false;
+}
+
+}  // namespace
+
+bool ReadDecimal(const char*& p, const char* end, int32_t& value) {
+    if (p == end || !FDigit(*p)) return false;
+    constexpr int64_t highest = std::numeric_limits<int32_t>::max();
+    int64_t number = 0;
+    for (; p != end && FDigit(*p); ++p) {
+        number = number * 10 + (*p - '0');
+        if (number > highest) number = highest;
+    }
+    value = static_cast<int32_t>(number);
+    return true;
+}
+
+char* WriteUnsigned(uint64_t value, char* out) {
+    char digits[20];
+    char* p = digits + sizeof digits;
+    do {
+        *--p = static_cast<char>('0' + value % 10);
+        value /= 10;
+    } while (value != 0);
+    const size_t n = static_cast<size_t>(digits + sizeof digits - p);
+    std::memcpy(out, p, n);
+    return out + n;
+}
+
+char* WriteDecimal(int64_t value, char* out) {
+    if (value >= 0) return WriteUnsigned(static_cast<uint64_t>(value), out);
+    *out++ = '-';
+    return WriteUnsigned(0 - static_cast<uint64_t>(value), out);
+}
+
+unsigned Copy(const char* text, char* out) {
+    const size_t n = std::strlen(text);
+    std::memcpy(out, text, n);
+    return static_cast<unsigned>(n);
+}
+
+unsigned FormatMoment(int64_t seconds, MomentParts parts, char* out) {
+    int64_t days = seconds / secondsPerDayG;
+    int64_t secondOfDay = seconds % secondsPerDayG;
+    if (secondOfDay < 0) {
+        secondOfDay += secondsPerDayG;
+        --days;
+    }
+    char* p = out;
+    if (parts != TIME_ONLY) p = WriteDate(days, p);
+    if (parts == DATE_AND_TIME) *p++ = ' ';
+    if (parts != DATE_ONLY) p = WriteTime(secondOfDay, p);
+    return static_cast<unsigned>(p - out);
+}
+
+bool ParseMoment(const char* text, unsigned nByte, MomentParts parts, int64_t& seconds, int& year) {
+    std::tm time{};
+    if (parts == TIME_ONLY) {  // strptime leaves the date alone: that of second 0
+        time.tm_year = 70;
+        time.tm_mday = 1;
+    }
+    if (!ReadCanonical(text, nByte, parts, time) && !ReadGeneral(text, nByte, parts, time)) return false;
+    year = time.tm_year + 1900;
+    const int64_t days = DaysOfDate(year, time.tm_mon + 1, time.tm_mday);
+    seconds = ((days * 24 + time.tm_hour) * 60 + time.tm_min) * 60 + time.tm_sec;
+    return true;
+}
+
+}  // namespace sorn::scalartext
