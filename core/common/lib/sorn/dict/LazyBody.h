@@ -1,0 +1,30 @@
+#pragma once
+
+#include "rox/ref.h"
+#include "sorn/model/OrvoVersion.h"
+
+class RoxMempool;
+class RoxString;
+
+/// The one knot between layers: dynamic values hold lazy bodies, and lazy bodies convert to dynamic values.
+/// This header names LazyDict for the layers below it and declares what they ask of it; the lazy layer
+/// defines it.
+namespace sorn {
+
+class ByteBuffer;
+class Dict;
+class Dictionary;
+class LazyDict;
+
+/// LazyDict::FromDictionary.
+ref<LazyDict> NewLazyBody(RoxMempool* pool, const ref<Dictionary>& dictionary, OrvoVersion version);
+/// LazyDict::FromJsonString of "{}".
+ref<LazyDict> NewEmptyLazyBody(RoxMempool* pool);
+/// LazyDict::ToDict; a null reference gives a new empty Dict in the pool.
+ref<Dict> DictOfLazyBody(RoxMempool* pool, const ref<LazyDict>& body);
+/// LazyDict::operator==; null equals only null.
+bool FEqualLazyBodies(const ref<LazyDict>& a, const ref<LazyDict>& b);
+/// LazyDict::ToJsonByteBuffer; a null reference writes "null".
+void WriteLazyBody(const ref<LazyDict>& body, ByteBuffer& out, bool pretty);
+
+}  // namespace sorn

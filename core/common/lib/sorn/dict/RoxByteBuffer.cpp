@@ -1,0 +1,47 @@
+#include "sorn/dict/RoxByteBuffer.h"
+
+#include <algorithm>
+#include <cstring>
+
+#include "rox/RoxAssert.h"
+
+namespace rox {
+
+void SizedObjectArray<1, RoxMempool>::Realloc(uint32_t n) {
+    RoxAssert(n >= lengthM, "SizedObjectArray: new storage smaller than the contents");
+    const uint32_t capacity = std::max(n, minCapacityG);
+    auto* const storage = static_cast<unsigned char*>(RoxMempool::CallocIn(poolM, capacity));
+    if (lengthM != 0) std::memcpy(storage, dataM, lengthM);
+    RoxMempool::FreeIn(poolM, dataM);
+    dataM = storage;
+    capacityM = capacity;
+}
+
+const char ByteBuffer::classTagG = 0;
+
+ByteBuffer::~ByteBuffer() = default;
+
+ref<ByteBuffer> ByteBuffer::New(RoxMempool* pool, const void* bytes, uint32_t n) {
+    ref<ByteBuffer> result = NewOfLength(pool, n);
+    if (n != 0) std::memcpy(result->MutableData(), bytes, n);
+    return result;
+}
+
+ref<ByteBuffer> ByteBuffer::New(RoxMempool* pool, const RoxString& text) {
+    return New(pool, text.Utf8(), text.NByte());
+}
+
+ref<ByteBuffer> ByteBuffer::NewOfLength(RoxMempool* pool, uint32_t n) {
+    ref<ByteBuffer> result(new (pool) ByteBuffer(pool));
+    if (n != 0) {
+        result->bytesM.Realloc(n);
+        result->bytesM.SetLength(n);
+    }
+    return result;
+}
+
+void* ByteBuffer::VkCastHelper(const void* classTag) {
+    return classTag == &classTagG ? this : RoxCore::VkCastHelper(classTag);
+}
+
+}  // namespace rox

@@ -1,0 +1,75 @@
+#pragma once
+
+#include <cstdint>
+
+#include "rox/RoxCore.h"
+#include "rox/RoxString.h"
+#include "rox/ref.h"
+
+namespace rox {
+
+/// The growing storage of counted arrays: elements of a fixed size in a pool. One thread at a time.
+template <unsigned elementSize, class Pool>
+class SizedObjectArray;
+
+template <>
+class SizedObjectArray<1, RoxMempool> {
+ public:
+    static constexpr uint32_t minCapacityG = 8;
+
+    explicit SizedObjectArray(RoxMempool* pool) : poolM(pool) {}
+    SizedObjectArray(const SizedObjectArray&) = delete;
+    SizedObjectArray& operator=(const SizedObjectArray&) = delete;
+    ~SizedObjectArray() { RoxMempool::FreeIn(poolM, dataM); }
+
+    /// Moves the elements to new, cleared storage of exactly n elements, 8 at least. n must not be below the
+    /// length.
+    void Realloc(uint32_t n);
+
+    unsigned char* GetData() const { return dataM; }  ///< null without storage
+    uint32_t GetCapacity() const { return capacityM; }
+    uint32_t GetLength() const { return lengthM; }
+    /// n must not be above the capacity.
+    void SetLength(uint32_t n) { lengthM = n; }
+
+ private:
+    RoxMempool* poolM;
+    unsigned char* dataM = nullptr;
+    uint32_t capacityM = 0;
+    uint32_t lengthM = 0;
+};
+
+/// A reference-counted array of bytes, the form in which byte payloads travel. At most 4,294,967,295 bytes.
+/// Shared ones do not change; only the count is atomic.
+class ByteBuffer : public RoxCore {
+ public:
+    static const char classTagG;
+
+    /// Empty, with no storage, in the object's pool.
+    ByteBuffer() : bytesM(GetMempool()) {}
+    /// With the pool that it is allocated in at hand.
+    explicit ByteBuffer(RoxMempool* pool) : RoxCore(pool), bytesM(pool) {}
+    ~ByteBuffer() override;
+
+    /// A new one in the pool with a copy of n bytes, in one allocation of that size, 8 at least; without
+    /// bytes it has no storage.
+    static ref<ByteBuffer> New(RoxMempool* pool, const void* bytes, uint32_t n);
+    /// All bytes of a text.
+    static ref<ByteBuffer> New(RoxMempool* pool, const RoxString& text);
+    /// A new one of n bytes, cleared, for the caller to fill.
+    static ref<ByteBuffer> NewOfLength(RoxMempool* pool, uint32_t n);
+
+    const unsigned char* GetData() const { return bytesM.GetData(); }  ///< null without storage
+    /// For whoever made the buffer, before it is shared.
+    unsigned char* MutableData() { return bytesM.GetData(); }
+    uint32_t GetLength() const { return bytesM.GetLength(); }
+    uint32_t GetCapacity() const { return bytesM.GetCapacity(); }
+    bool FEmpty() const { return bytesM.GetLength() == 0; }
+
+    void* VkCastHelper(const void* classTag) override;
+
+ protected:
+    SizedObjectArray<1, RoxMempool> bytesM;
+};
+
+}  // namespace rox
