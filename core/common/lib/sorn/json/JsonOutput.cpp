@@ -1,0 +1,120 @@
+#include "sorn/json/JsonOutput.h"
+
+#include <algorithm>
+#include <utility>
+
+#include "kelbaselib/Bytesink.h"
+#include "rox/RoxAssert.h"
+#include "sorn/dict/ByteBuffer.h"
+#include "sorn/dict/LazyBody.h"
+
+namespace sorn {
+
+void JsonOutput::Bytes(const void* bytes, size_t n) {
+    const unsigned char* p = static_cast<const unsigned char*>(bytes);
+    while (n > 0) {
+        const size_t piece = std::min<size_t>(n, maxRoomG);
+        std::memcpy(Room(static_cast<unsigned>(piece)), p, piece);
+        pNextM += piece;
+        p += piece;
+        n -= piece;
+    }
+}
+
+void JsonOutput::Blanks(size_t n) {
+    while (n > 0) {
+        const size_t piece = std::min<size_t>(n, maxRoomG);
+        std::memset(Room(static_cast<unsigned>(piece)), ' ', piece);
+        pNextM += piece;
+        n -= piece;
+    }
+}
+
+void JsonBufferOutput::Close() {
+    bufferM.Commit(static_cast<unsigned>(pNextM - pBeginM));
+    pBeginM = pNextM = pEndM = nullptr;
+}
+
+void JsonBufferOutput::NextWindow(unsigned n) {
+    constexpr unsigned smallestWindow = 256;
+    constexpr unsigned largestWindow = 1u << 28;
+    Close();
+    const unsigned length = bufferM.GetLength();
+    const unsigned capacity = bufferM.GetCapacity();
+    // The buffer keeps its capacity a byte ahead of its data.
+    unsigned window = capacity > length ? capacity - length - 1 : 0;
+    if (window < n) {
+        // As much again as stands there, so that a long text is moved few times.
+        window = std::max({n, smallestWindow, std::min(length, largestWindow)});
+        if (window > (~0u - length) / 2) window = n;
+    }
+    pBeginM = pNextM = bufferM.Reserve(window);
+    pEndM = pBeginM + window;
+}
+
+void JsonBufferOutput::LazyBody(const ref<LazyDict>& body, bool pretty) {
+    Close();
+    WriteLazyBody(body, bufferM, pretty);
+}
+
+JsonTextOutput::JsonTextOutput(RoxMempool* pool) : pMempoolM(pool) {
+    pBeginM = pNextM = firstM;
+    pEndM = firstM + sizeof firstM;
+}
+
+JsonTextOutput::~JsonTextOutput() {
+    if (pLongM != nullptr) pLongM->DownRef();
+}
+
+void JsonTextOutput::NextWindow(unsigned n) {
+    const size_t length = static_cast<size_t>(pNextM - pBeginM);
+    RoxAssert(length + n <= UINT32_MAX, "JSON text of 4 GiB or more");
+    const uint32_t capacity = static_cast<uint32_t>(std::min<size_t>(length * 2 + n, UINT32_MAX));
+    if (pLongM == nullptr) {
+        pLongM = RoxStringRepN::New(pMempoolM, capacity);
+        std::memcpy(pLongM->MutableBytes(), firstM, length);
+    } else {
+        pLongM = RoxStringRepN::Resize(pLongM, capacity);
+    }
+    pBeginM = reinterpret_cast<unsigned char*>(pLongM->MutableBytes());
+    pNextM = pBeginM + length;
+    pEndM = pBeginM + capacity;
+}
+
+RoxString JsonTextOutput::Take() {
+    const uint32_t length = static_cast<uint32_t>(pNextM - pBeginM);
+    if (pLongM == nullptr) return RoxString::FromUtf8Bytes(pMempoolM, length, firstM);
+    RoxStringRepN* const text = RoxStringRepN::Resize(std::exchange(pLongM, nullptr), length);
+    pBeginM = pNextM = pEndM = nullptr;
+    return RoxString::AdoptRepN(text);
+}
+
+void JsonTextOutput::LazyBody(const ref<LazyDict>& body, bool pretty) {
+    ByteBuffer text(pMempoolM);
+    WriteLazyBody(body, text, pretty);
+    Bytes(text.GetData(), text.GetLength());
+}
+
+JsonSinkOutput::JsonSinkOutput(kelbaselib::Bytesink& sink, RoxMempool* pool) : sinkM(sink), pMempoolM(pool) {
+    pBeginM = pNextM = windowM;
+    pEndM = windowM + windowG;
+}
+
+void JsonSinkOutput::Flush() {
+    if (pNextM != pBeginM) sinkM.Write(windowM, static_cast<unsigned>(pNextM - pBeginM));
+    pNextM = pBeginM;
+}
+
+void JsonSinkOutput::NextWindow(unsigned) {
+    static_assert(windowG >= maxRoomG);
+    Flush();
+}
+
+void JsonSinkOutput::LazyBody(const ref<LazyDict>& body, bool pretty) {
+    ByteBuffer text(pMempoolM);
+    WriteLazyBody(body, text, pretty);
+    Flush();
+    if (text.GetLength() > 0) sinkM.Write(text.GetData(), text.GetLength());
+}
+
+}  // namespace sorn

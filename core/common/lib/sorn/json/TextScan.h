@@ -1,0 +1,76 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <cstring>
+
+#include "sorn/json/ByteClass.h"
+
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
+/// Searches over runs of bytes, many bytes at a time. No operation reads outside its run.
+namespace sorn::textscan {
+
+/// The first byte from p on that is no white space, or `end`; `end` may lie below p, then p.
+inline const unsigned char* SkipWhitespace(const unsigned char* p, const unsigned char* end) {
+    while (p < end && byteclass::FIs(*p, byteclass::WHITE)) ++p;
+    return p;
+}
+
+/// The end of the run of token bytes that begins at p.
+inline const unsigned char* FindTokenEnd(const unsigned char* p, const unsigned char* end) {
+    while (p < end && byteclass::FIs(*p, byteclass::TOKEN)) ++p;
+    return p;
+}
+
+/// Eight bytes at once. Each test gives a word whose lowest set bit lies in the first byte that it holds for;
+/// bits above that byte may be wrong.
+class Word {
+ public:
+    static constexpr uint64_t onesG = 0x0101010101010101;
+    static constexpr uint64_t highG = 0x8080808080808080;
+
+    static uint64_t Load(const unsigned char* p) {
+        uint64_t word;
+        std::memcpy(&word, p, sizeof word);
+        return word;
+    }
+    static uint64_t Below(uint64_t word, unsigned char bound) {
+        return (word - onesG * bound) & ~word & highG;
+    }
+    static uint64_t Equal(uint64_t word, unsigned char byte) { return Below(word ^ (onesG * byte), 1); }
+    /// Number of the byte of the lowest set bit, in the order of memory on a little-endian machine.
+    static unsigned FirstByte(uint64_t bits) { return static_cast<unsigned>(__builtin_ctzll(bits)) / 8; }
+};
+
+static_assert(__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__, "words are searched from their low end");
+
+/// The first double quote, backslash or NUL from p on, or `end`.
+inline const unsigned char* FindStringStop(const unsigned char* p, const unsigned char* end) {
+#if defined(__SSE2__)
+    for (; end - p >= 16; p += 16) {
+        const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(p));
+        const __m128i stops = _mm_or_si128(_mm_or_si128(_mm_cmpeq_epi8(bytes, _mm_set1_epi8('"')),
+                                                        _mm_cmpeq_epi8(bytes, _mm_set1_epi8('\\'))),
+                                           _mm_cmpeq_epi8(bytes, _mm_setzero_si128()));
+        const int mask = _mm_movemask_epi8(stops);
+        if (mask != 0) return p + __builtin_ctz(static_cast<unsigned>(mask));
+    }
+#endif
+    for (; end - p >= 8; p += 8) {
+        const uint64_t word = Word::Load(p);
+        const uint64_t stops = Word::Equal(word, '"') | Word::Equal(word, '\\') | Word::Below(word, 1);
+        if (stops != 0) return p + Word::FirstByte(stops);
+    }
+    while (p < end && *p != '"' && *p != '\\' && *p != 0) ++p;
+    return p;
+}
+
+/// Whether one of the eight bytes is below 0x20, a double quote or a backslash.
+inline bool FControlOrQuoteIn(uint64_t word) {
+    return (Word::Below(word, 0x20) | Word::Equal(word, '"') | Word::Equal(word, '\\')) != 0;
+}
+
+}  // namespace sorn::textscan

@@ -1,0 +1,149 @@
+#include "sorn/json/ValueWriter.h"
+
+#include "rox/VkCast.h"
+#include "sorn/dict/ArrayValue.h"
+#include "sorn/dict/LazyDictValue.h"
+#include "sorn/dict/StringValue.h"
+#include "sorn/json/StringWriter.h"
+
+namespace sorn {
+
+namespace {
+
+void WriteNullOrLazy(const DictValue& value, JsonOutput& out, bool pretty) {
+    // The two classes share their tag.
+    const LazyDictValue* const lazy = VkCast<LazyDictValue>(const_cast<DictValue*>(&value));
+    if (lazy == nullptr) {
+        out.Literal("null");
+    } else {
+        // Only the flag goes on: the body begins again at indentation 0.
+        out.LazyBody(lazy->GetValue(), pretty);
+    }
+}
+
+/// Asks for what the writing of a value reads first behind the value itself: it lies anywhere, and is wanted
+/// soon.
+void Prefetch(const DictValue* value) {
+    if (value == nullptr) return;
+    switch (value->GetTag()) {
+        case dictvalue::STRING:
+            __builtin_prefetch(static_cast<const StringValue*>(value)->GetValue().GetRepN());
+            break;
+        case dictvalue::DICTIONARY:
+            DictionaryEntries::Prefetch(static_cast<const Dictionary&>(*value));
+            break;
+        case dictvalue::ARRAY:
+            __builtin_prefetch(static_cast<const ArrayValue*>(value)->GetElements().GetData());
+            break;
+        default:
+            break;
+    }
+}
+
+}  // namespace
+
+void ValueWriter::Write(const DictValue& value) {
+    Begin(value);
+    while (!framesM.FEmpty()) {
+        if (framesM.Top().array != nullptr) {
+            ContinueArray();
+        } else {
+            ContinueDictionary();
+        }
+    }
+}
+
+bool ValueWriter::Begin(const DictValue& value) {
+    switch (value.GetTag()) {
+        case dictvalue::STRING: {
+            const StringValue& text = static_cast<const StringValue&>(value);
+            stringwriter::WriteText(text.GetValue(), text.FNeedQuotes(), outM);
+            return true;
+        }
+        case dictvalue::ARRAY:
+            BeginArray(static_cast<const ArrayValue&>(value));
+            return false;
+        case dictvalue::DICTIONARY:
+            BeginDictionary(static_cast<const Dictionary&>(value));
+            return false;
+        default:
+            WriteNullOrLazy(value, outM, formatM.isPretty);
+            return true;
+    }
+}
+
+void ValueWriter::BeginArray(const ArrayValue& array) {
+    outM.Byte('[');
+    NewLine();
+    ++formatM.indentLevel;
+    framesM.Push({&array, 0, 0, array.CountValues(), false, 0});
+}
+
+void ValueWriter::BeginDictionary(const Dictionary& dictionary) {
+    outM.Byte('{');
+    ++formatM.indentLevel;
+    framesM.Push({nullptr, 0, 0, DictionaryEntries::Count(dictionary), false, namesM.Size()});
+    DictionaryEntries::PushSorted(dictionary, namesM);
+}
+
+void ValueWriter::ContinueArray() {
+    Frame& frame = framesM.Top();
+    while (frame.next < frame.count) {
+        const DictValue* const element = frame.array->At(frame.next++);
+        if (frame.next < frame.count) Prefetch(frame.array->At(frame.next));
+        if (frame.next + 1 < frame.count) __builtin_prefetch(frame.array->At(frame.next + 1));
+        if (element == nullptr) continue;
+        if (frame.isBehindFirst) {
+            outM.Literal(", ");
+            NewLine();
+        }
+        frame.isBehindFirst = true;
+        Indent();
+        if (!Begin(*element)) return;
+    }
+    End(']');
+}
+
+void ValueWriter::ContinueDictionary() {
+    Frame& frame = framesM.Top();
+    for (; frame.next < frame.count; ++frame.next, frame.nextOfName = 0) {
+        // By reference: the two words were stored one by one, and are best loaded so.
+        const DictionaryEntries::Name& name = namesM[frame.firstName + frame.next];
+        if (frame.next + 1 < frame.count) Prefetch((&name)[1].GetStored());
+        const DictValue* const stored = name.GetStored();
+        if (stored == nullptr) continue;
+        if (stored->GetTag() != dictvalue::NONE) {
+            if (frame.nextOfName++ != 0) continue;
+            if (!WriteMember(frame, name, *stored)) return;
+            continue;
+        }
+        const unsigned nValues = name.CountValues();
+        while (frame.nextOfName < nValues) {
+            const DictValue* const value = name.At(frame.nextOfName++);
+            if (value != nullptr && !WriteMember(frame, name, *value)) return;
+        }
+    }
+    for (uint32_t i = 0; i < frame.count; ++i) namesM.Pop();
+    End('}');
+}
+
+/// False when a container opened.
+bool ValueWriter::WriteMember(Frame& frame, const DictionaryEntries::Name& name, const DictValue& value) {
+    if (frame.isBehindFirst) outM.Literal(", ");
+    frame.isBehindFirst = true;
+    NewLine();
+    Indent();
+    stringwriter::WriteQuoted(name.Utf8(), name.NByte(), outM);
+    outM.Literal(": ");
+    return Begin(value);
+}
+
+void ValueWriter::End(char bracket) {
+    NewLine();
+    --formatM.indentLevel;
+    Indent();
+    outM.Byte(bracket);
+    framesM.Pop();
+}
+
+}  // namespace sorn
