@@ -1,0 +1,31 @@
+#pragma once
+
+#include <cstdint>
+
+#include "rox/RoxString.h"
+#include "sorn/convert/ErrorWords.h"
+#include "sorn/model/FieldInfo.h"
+
+/// The text forms that take their words from the schema: enumerations and ids.
+namespace sorn::schematext {
+
+/// Bytes of the longest text of an id, prefix included; longer ones are cut there.
+constexpr unsigned maxIdBytesG = 99;
+
+/// The name of a value of the field's enumeration, shared through the global string table, or
+/// "INVALID_VALUE:%u" in the pool for a value without a name.
+RoxString EnumName(RoxMempool* pool, const FieldInfo& field, uint32_t value);
+/// The value of a name: the lowest one when several have it. False and words when none has.
+bool EnumValue(const FieldInfo& field, const RoxString& name, uint32_t& value, ErrorWords& words);
+
+/// The idPrefix of the field's struct and the id; "XXX" for a field without a struct.
+RoxString LongIdText(RoxMempool* pool, const FieldInfo& field, uint64_t id);
+RoxString StringIdText(RoxMempool* pool, const FieldInfo& field, const RoxString& id);
+
+/// What follows the prefix of the field's struct in a text, as a pointer into the text. Null and words when
+/// the field has no struct or the text does not begin with the prefix.
+const char* BareId(const FieldInfo& field, const RoxString& text, ErrorWords& words);
+/// What BareId gave for `text`, as a string of its own in the pool.
+RoxString BareString(RoxMempool* pool, const RoxString& text, const char* bare);
+
+}  // namespace sorn::schematext
