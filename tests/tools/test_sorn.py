@@ -1,0 +1,179 @@
+"""The sorn command from outside: what it prints, where, and what it exits with. The command to run (with an emulator in
+front of it on a cross build) comes in SORN_TOOL."""
+
+import json
+import os
+import pty
+import shlex
+import subprocess
+import tempfile
+import time
+import unittest
+from pathlib import Path
+
+TOOL = shlex.split(os.environ["SORN_TOOL"])
+ROOT = Path(__file__).resolve().parents[2]
+DONE, SOME_REFUSED, WRONG_USAGE = 0, 1, 2
+
+
+def run(*arguments, text=b""):
+    """Runs the tool on the text; gives its exit code, standard output and standard error."""
+    done = subprocess.run([*TOOL, *arguments], input=text, capture_output=True, timeout=300)
+    return done.returncode, done.stdout, done.stderr
+
+
+class Usage(unittest.TestCase):
+    def test_help_on_every_level(self):
+        for arguments in (["--help"], ["describe", "--help"], ["convert", "--help"]):
+            code, out, err = run(*arguments)
+            self.assertEqual((code, err), (DONE, b""), arguments)
+            self.assertIn(b"Usage: sorn", out)
+
+    def test_wrong_usage(self):
+        for arguments in ([], ["nonsense"], ["convert", "--nonsense"], ["convert", "--from", "yaml"],
+                          ["convert", "--schema-version", "-1"], ["convert", "--schema-version", "x"],
+                          ["describe", "Recording"], ["describe", "0"], ["describe", "130"], ["describe", "99999999999"],
+                          ["describe", "-3"], ["convert", "/nowhere/in.json"], ["convert", "-o", "/nowhere/out.json"]):
+            code, out, err = run(*arguments)
+            self.assertEqual((code, out), (WRONG_USAGE, b""), arguments)
+            self.assertNotEqual(err, b"", arguments)
+
+    def test_completion_knows_every_option(self):
+        completion = (ROOT / "tools/completion/sorn.bash").read_text()
+        for command in ("describe", "convert"):
+            out = run(command, "--help")[1].decode()
+            for word in out.replace(",", " ").split():
+                if word.startswith("--"):
+                    self.assertIn(word, completion, command)
+
+
+class Describe(unittest.TestCase):
+    def test_record(self):
+        code, out, err = run("describe", "audioStream")
+        self.assertEqual((code, err), (DONE, b""))
+        lines = [line.split() for line in out.decode().splitlines()]
+        self.assertEqual(lines[0], 'audioStream: record 2084, 8 slots, ids begin with "vuka:aus."'.split())
+        self.assertEqual(lines[2], "1 audioStreamFormat enum audioStreamFormat optional 22-42".split())
+        self.assertEqual(lines[3], "1 audioStreamFormat enum audioStreamFormat required 7-21 older form".split())
+        self.assertEqual(run("describe", "2084")[1], out)
+
+    def test_enumeration_with_a_hole(self):
+        out = run("describe", "channelListType")[1].decode()
+        self.assertEqual([line.split() for line in out.splitlines()],
+                         ["channelListType: enumeration 681, values below 3".split(), ["1", "favorites"], ["2", "received"]])
+
+    def test_list(self):
+        lines = run("describe")[1].decode().splitlines()
+        self.assertEqual(len(lines), 286 + 192)
+        self.assertEqual(lines[0].split(), ["129", "record", "account"])
+        self.assertIn(["702", "enumeration", "errorCode"], [line.split() for line in lines])
+
+    def test_json_of_all(self):
+        all_metadata = json.loads(run("describe", "--json")[1])
+        self.assertEqual({key: all_metadata[key] for key in all_metadata if isinstance(all_metadata[key], int)},
+                         {"firstSchemaVersion": 7, "lastSchemaVersion": 42, "defaultSchemaVersion": 42,
+                          "nStructDef": 5919, "nEnumDef": 5801})
+        self.assertEqual((len(all_metadata["structs"]), len(all_metadata["enums"])), (286, 192))
+        self.assertEqual(len(all_metadata["structNameHashTable"]), 661)
+        self.assertEqual(sum(1 for name in all_metadata["structNameHashTable"] if name is not None), 286)
+        self.assertEqual(sum(len(struct["fields"]) for struct in all_metadata["structs"]), 2698)
+
+    def test_json_of_one(self):
+        hello = {"name": "orvoRpcHello", "id": 1449, "idPrefix": None, "nFields": 2, "fields": [
+            {"slot": 1, "name": "identity", "dataType": 17, "arity": 2, "firstVersion": 7, "lastVersion": 42,
+             "typeRef": 0, "variants": []}]}
+        self.assertEqual(json.loads(run("describe", "--json", "orvoRpcHello")[1]), hello)
+        remove = json.loads(run("describe", "--json", "localApplicationDataRemove")[1])
+        key = [field for field in remove["fields"] if field["name"] == "key"][0]
+        self.assertEqual((key["firstVersion"], key["lastVersion"]), (26, 42))
+        self.assertEqual(key["variants"], [{"slot": 2, "name": "key", "dataType": 17, "arity": 2, "firstVersion": 7,
+                                            "lastVersion": 25, "typeRef": 0}])
+        self.assertEqual(json.loads(run("describe", "--json", "681")[1]),
+                         {"id": 681, "name": "channelListType", "count": 3, "names": {"1": "favorites", "2": "received"}})
+
+
+class Convert(unittest.TestCase):
+    def test_one_record(self):
+        self.assertEqual(run("convert", text=b'{type:hostAndPort, port:"80", host:"a b"}'),
+                         (DONE, b'{"host": "a b", "port": 80, "type": "hostAndPort"}\n', b""))
+
+    def test_pretty(self):
+        self.assertEqual(run("convert", "--pretty", text=b'{"type":"updateTemplate","fieldNumber":5}')[1],
+                         b'{\n    "fieldNumber": 5, \n    "type": "updateTemplate"\n}\n')
+
+    def test_refused_record(self):
+        self.assertEqual(run("convert", text=b"[]"), (SOME_REFUSED, b"", b"JSON must start with '{'.\n"))
+
+    def test_versions(self):
+        text = b'{"type":"audioStream","audioStreamFormat":"nonsense"}'
+        words = b"bad enum item nameCannot convert value for the field.. Bad single field: audioStreamFormat\n"
+        self.assertEqual(run("convert", "--schema-version", "7", text=text), (SOME_REFUSED, b"", words))
+        self.assertEqual(run("convert", "--schema-version", "7", text=b'{"type":"audioStream"}'),
+                         (SOME_REFUSED, b"", b"Required field not set: audioStreamFormat\n"))
+        self.assertEqual(run("convert", "--schema-version", "22", text=b'{"type":"audioStream"}'),
+                         (DONE, b'{"type": "audioStream"}\n', b""))
+        self.assertEqual(run("convert", "--schema-version", "43", text=b'{"type":"audioStream"}')[2],
+                         b"Unmarshaling to SornObject: given orvo version is out of range used in code generation: \x2b\n")
+
+    def test_lines(self):
+        text = b'{"type":"success"}\nnonsense\n{"type":"updateTemplate","fieldNumber":1}\n\n{"type":"success"}'
+        code, out, err = run("convert", "--lines", text=text)
+        self.assertEqual(code, SOME_REFUSED)
+        self.assertEqual(out.split(b"\n"), [b'{"type": "success"}', b"", b'{"fieldNumber": 1, "type": "updateTemplate"}', b"",
+                                            b'{"type": "success"}', b""])
+        self.assertEqual(err, b"line 2: JSON must start with '{'.\nline 4: JSON must start with '{'.\n")
+        self.assertEqual(run("convert", "--lines", text=b""), (DONE, b"", b""))
+
+    def test_lines_longer_than_a_piece(self):
+        title = b"x" * 200000
+        record = b'{"fieldName": "' + title + b'", "type": "responseTemplateFieldInfo"}\n'
+        self.assertEqual(run("convert", "--lines", text=record * 3), (DONE, record * 3, b""))
+
+    def test_files(self):
+        with tempfile.TemporaryDirectory() as folder:
+            source, target = Path(folder, "in.json"), Path(folder, "out.json")
+            source.write_bytes(b'{"type":"success"}')
+            self.assertEqual(run("convert", "-o", str(target), str(source)), (DONE, b"", b""))
+            self.assertEqual(target.read_bytes(), b'{"type": "success"}\n')
+            self.assertEqual(run("convert", folder)[0], SOME_REFUSED)
+
+    def test_full_disk(self):
+        code, _, err = run("convert", "-o", "/dev/full", text=b'{"type":"success"}')
+        self.assertEqual(code, SOME_REFUSED)
+        self.assertIn(b"could not be written", err)
+
+    def test_examples_come_back_unchanged(self):
+        files = sorted((ROOT / "examples/data").glob("*.jsonl"))
+        records = 0
+        types = set()
+        for file in files:
+            text = file.read_bytes()
+            code, out, err = run("convert", "--lines", "--schema-version", "42", str(file))
+            self.assertEqual((code, err), (DONE, b""), file.name)
+            self.assertEqual(out, text, file.name)
+            records += text.count(b"\n")
+            types |= {json.loads(line)["type"] for line in text.splitlines()}
+        self.assertGreaterEqual(records, 200)
+        self.assertGreaterEqual(len(types), 15)
+
+    def test_progress_only_on_a_terminal(self):
+        line = b'{"fieldName": "' + b"x" * 1000 + b'", "type": "responseTemplateFieldInfo"}\n'
+        with tempfile.NamedTemporaryFile() as file:
+            file.write(line * 1000)
+            file.flush()
+            leader, follower = pty.openpty()
+            with subprocess.Popen([*TOOL, "convert", "--lines", file.name], stdout=subprocess.PIPE, stderr=follower) as tool:
+                os.close(follower)
+                first = tool.stdout.read(1)
+                time.sleep(1.5)  # the pipe is full and the tool waits: its work takes more than a second
+                out = first + tool.stdout.read()
+            shown = os.read(leader, 65536)
+            os.close(leader)
+            self.assertEqual((tool.returncode, out), (DONE, line * 1000))
+            self.assertRegex(shown, rb"^\r\[#*\.*\] +[0-9]+ %")
+            self.assertTrue(shown.endswith(b"\r\x1b[K"), shown[-80:])
+            self.assertEqual(run("convert", "--lines", file.name)[2], b"")
+
+
+if __name__ == "__main__":
+    unittest.main()

@@ -1,0 +1,37 @@
+#pragma once
+
+#include <cstdio>
+#include <string>
+#include <vector>
+
+namespace sorn::tools {
+
+/// Reads an open file in large pieces, as lines or whole. The file stays the caller's.
+class LineReader {
+ public:
+    /// The library counts bytes of a text in 32 bits.
+    static constexpr size_t maxRecordBytesG = 0xFFFFFFFF;
+
+    explicit LineReader(std::FILE* file);
+
+    /// The next line without its line feed; the last one may lack it. False at the end, or when FFailed.
+    bool ReadLine(std::string& line);
+    /// All that is left. False when it could not be read or is longer than maxRecordBytesG.
+    bool ReadAll(std::string& text);
+    /// Whether reading failed, or a line is longer than maxRecordBytesG.
+    bool FFailed() const { return fFailedM; }
+
+ private:
+    /// The next piece; false at the end or on failure.
+    bool Refill();
+    /// Takes up to `n` bytes at the front of the piece; false when the text grows too long.
+    bool Take(size_t n, std::string& text);
+
+    std::FILE* pFileM;
+    std::vector<char> vPieceM;
+    size_t nextM = 0;
+    size_t endM = 0;
+    bool fFailedM = false;
+};
+
+}  // namespace sorn::tools

@@ -1,0 +1,21 @@
+# Completion of the sorn command for bash: source this file, or install it under share/bash-completion/completions.
+_sorn() {
+    local word=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]} command=${COMP_WORDS[1]:-}
+    if [ "$COMP_CWORD" -eq 1 ]; then
+        mapfile -t COMPREPLY < <(compgen -W 'describe convert --help --help-all' -- "$word")
+        return
+    fi
+    case $previous in
+        --from | --to) mapfile -t COMPREPLY < <(compgen -W 'json' -- "$word"); return ;;
+        --road) mapfile -t COMPREPLY < <(compgen -W 'dictionary' -- "$word"); return ;;
+    esac
+    case $command:$word in
+        describe:-*) mapfile -t COMPREPLY < <(compgen -W '--json --help' -- "$word") ;;
+        describe:*) mapfile -t COMPREPLY < <(compgen -W "$(sorn describe | awk '{print $3}')" -- "$word") ;;
+        convert:-*)
+            mapfile -t COMPREPLY < <(compgen -W '--from --to --road --schema-version --pretty --lines --output --help' -- "$word")
+            ;;
+        convert:*) mapfile -t COMPREPLY < <(compgen -f -- "$word") ;;
+    esac
+}
+complete -F _sorn sorn
