@@ -1,22 +1,25 @@
 #include "tools/Convert.h"
 
+#include <sys/stat.h>
+
 #include <cstdio>
 #include <string>
 
 #include "rox/RoxMempool.h"
 #include "sorn/convert/DictionarySornObject.h"
 #include "sorn/dict/Dictionary.h"
+#include "sorn/json/JsonFormat.h"
 #include "sorn/model/Schema.h"
 #include "tools/ExitCode.h"
 #include "tools/LineReader.h"
+#include "tools/Output.h"
 #include "tools/Progress.h"
 
 namespace sorn::tools {
 
 namespace {
 
-/// Text to dictionary to object to dictionary to text. A null dictionary and words when the record is
-/// refused.
+/// Text to dictionary to object to dictionary. A null dictionary and words when the record is refused.
 ref<Dictionary> TakeThroughObject(RoxMempool* pool, const std::string& text, OrvoVersion version,
                                   RoxString& error) {
     ref<Dictionary> dictionary = Dictionary::FromJson(reinterpret_cast<const unsigned char*>(text.data()),
@@ -28,61 +31,69 @@ ref<Dictionary> TakeThroughObject(RoxMempool* pool, const std::string& text, Orv
     return converter.SornObjectToDictionary(object.get(), version);
 }
 
-/// Converts records one after another and remembers how it went.
-class Converter {
- public:
-    Converter(const ConvertOptions& options, std::FILE* out) : optionsM(options), pOutM(out) {}
-
-    /// Writes the record's line, an empty one when it is refused; `prefix` goes before the words.
-    void ConvertRecord(const std::string& text, const std::string& prefix) {
-        RoxMempool pool("sorn convert");
-        RoxString error;
-        const ref<Dictionary> result = TakeThroughObject(&pool, text, optionsM.schemaVersion, error);
-        if (result) {
-            const RoxString json = result->ToJson(optionsM.pretty);
-            Write(json.Utf8(), json.NByte());
-        } else {
-            fRefusedM = true;
-            const std::string words = prefix + std::string(error.View()) + "\n";
-            std::fwrite(words.data(), 1, words.size(), stderr);
-        }
-        if (result || optionsM.lines) Write("\n", 1);
+/// Writes the record's text and a line feed, and gives true; or gives the words and false. The text goes out
+/// in pieces: pretty text of a deep record is much longer than the record.
+bool ConvertRecord(const ConvertOptions& options, const std::string& record, std::FILE* out,
+                   std::string& words) {
+    RoxMempool pool("sorn convert");
+    RoxString error;
+    const ref<Dictionary> result = TakeThroughObject(&pool, record, options.schemaVersion, error);
+    if (!result) {
+        words = std::string(error.View()) + "\n";
+        return false;
     }
+    FileSink sink(out);
+    result->ToJson(sink, JsonFormat(options.pretty));
+    std::fputc('\n', out);
+    return true;
+}
 
-    /// Flushes; false when something could not be written.
-    bool Finish() { return std::fflush(pOutM) == 0 && !fWriteFailedM; }
-    bool FWriteFailed() const { return fWriteFailedM; }
-    bool FRefused() const { return fRefusedM; }
+void WriteWords(const std::string& words) {
+    std::fwrite(words.data(), 1, words.size(), stderr);
+}
 
- private:
-    void Write(const char* bytes, size_t n) { fWriteFailedM |= std::fwrite(bytes, 1, n, pOutM) != n; }
+/// False when a line was refused.
+bool ConvertLines(const ConvertOptions& options, LineReader& reader, std::FILE* in, std::FILE* out) {
+    Progress progress(in, out);
+    bool fAllDone = true;
+    std::string record;
+    std::string words;
+    for (unsigned long number = 1; std::ferror(out) == 0; ++number) {
+        if (!reader.FLineReady()) std::fflush(out);  // the next line may be long in coming
+        if (!reader.ReadLine(record)) break;
+        if (!ConvertRecord(options, record, out, words)) {
+            fAllDone = false;
+            std::fputc('\n', out);
+            progress.Hide();
+            WriteWords("line " + std::to_string(number) + ": " + words);
+        }
+        progress.Advance(record.size() + 1);
+    }
+    return fAllDone;
+}
 
-    const ConvertOptions& optionsM;
-    std::FILE* pOutM;
-    bool fRefusedM = false;
-    bool fWriteFailedM = false;
-};
+bool ConvertOne(const ConvertOptions& options, LineReader& reader, std::FILE* out) {
+    std::string record;
+    std::string words;
+    if (!reader.ReadAll(record) || ConvertRecord(options, record, out, words)) return true;
+    WriteWords(words);
+    return false;
+}
 
 int ConvertStream(const ConvertOptions& options, std::FILE* in, std::FILE* out) {
-    Converter converter(options, out);
-    LineReader reader(in);
-    std::string record;
-    bool fReadAll = true;
-    if (options.lines) {
-        Progress progress(in);
-        for (unsigned long number = 1; !converter.FWriteFailed() && reader.ReadLine(record); ++number) {
-            converter.ConvertRecord(record, "line " + std::to_string(number) + ": ");
-            progress.Advance(record.size() + 1);
-        }
-        fReadAll = !reader.FFailed();
-    } else {
-        fReadAll = reader.ReadAll(record);
-        if (fReadAll) converter.ConvertRecord(record, "");
-    }
-    if (!fReadAll) std::fprintf(stderr, "the input could not be read, or a record is 4 GiB or longer\n");
-    const bool fWritten = converter.Finish();
-    if (!fWritten) std::fprintf(stderr, "the output could not be written\n");
-    return fReadAll && fWritten && !converter.FRefused() ? DONE : SOME_REFUSED;
+    LineReader reader(::fileno(in));
+    const bool fAllDone =
+        options.lines ? ConvertLines(options, reader, in, out) : ConvertOne(options, reader, out);
+    if (reader.FFailed()) std::fputs("the input could not be read, or a record is 4 GiB or longer\n", stderr);
+    return FinishOutput(out) && fAllDone && !reader.FFailed() ? DONE : SOME_REFUSED;
+}
+
+/// Whether the path names the open file; opening it for output would empty it.
+bool FSameFile(const std::string& path, std::FILE* file) {
+    struct stat a {};
+    struct stat b {};
+    return ::stat(path.c_str(), &a) == 0 && ::fstat(::fileno(file), &b) == 0 && S_ISREG(a.st_mode) &&
+           a.st_dev == b.st_dev && a.st_ino == b.st_ino;
 }
 
 std::FILE* Open(const std::string& path, const char* mode, std::FILE* standard) {
@@ -92,22 +103,28 @@ std::FILE* Open(const std::string& path, const char* mode, std::FILE* standard) 
     return file;
 }
 
+int ConvertInto(const ConvertOptions& options, std::FILE* in) {
+    if (!options.outPath.empty() && FSameFile(options.outPath, in)) {
+        std::fprintf(stderr, "%s: is the input, too\n", options.outPath.c_str());
+        return WRONG_USAGE;
+    }
+    std::FILE* out = Open(options.outPath, "wbe", stdout);
+    if (out == nullptr) return WRONG_USAGE;
+    int code = ConvertStream(options, in, out);
+    if (out != stdout && std::fclose(out) != 0) {
+        std::perror(options.outPath.c_str());
+        code = SOME_REFUSED;
+    }
+    return code;
+}
+
 }  // namespace
 
 int Convert(const ConvertOptions& options) {
     std::FILE* in = Open(options.inPath, "rbe", stdin);
     if (in == nullptr) return WRONG_USAGE;
-    std::FILE* out = Open(options.outPath, "wbe", stdout);
-    if (out == nullptr) {
-        if (in != stdin) std::fclose(in);
-        return WRONG_USAGE;
-    }
-    int code = ConvertStream(options, in, out);
+    const int code = ConvertInto(options, in);
     if (in != stdin) std::fclose(in);
-    if (out != stdout && std::fclose(out) != 0) {
-        std::perror(options.outPath.c_str());
-        code = SOME_REFUSED;
-    }
     return code;
 }
 

@@ -6,6 +6,7 @@
 #include "sorn/model/Schema.h"
 #include "tools/DescribeJson.h"
 #include "tools/ExitCode.h"
+#include "tools/Output.h"
 #include "tools/SchemaNames.h"
 
 namespace sorn::tools {
@@ -69,7 +70,7 @@ int Describe(const DescribeOptions& options) {
     } else {
         PrintEnum(id);
     }
-    return std::fflush(stdout) == 0 ? DONE : SOME_REFUSED;
+    return FinishOutput(stdout) ? DONE : SOME_REFUSED;
 }
 
 }  // namespace sorn::tools

@@ -40,7 +40,7 @@ std::string JsonOfField(int slot, const StructInfo& info) {
     Separator comma;
     for (uint16_t i = 0; i < history.nVariants; ++i) {
         text += comma.Next();
-        text += "{" + FieldMembers(slot, info, history.vVariants[i]) + "}";
+        text += "{" + FieldMembers(slot, info, history.vVariants[i]) + ",\"variants\":[]}";
     }
     return text + "]}";
 }

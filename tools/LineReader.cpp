@@ -1,5 +1,8 @@
 #include "tools/LineReader.h"
 
+#include <unistd.h>
+
+#include <cerrno>
 #include <cstring>
 
 namespace sorn::tools {
@@ -10,13 +13,21 @@ constexpr size_t pieceBytesG = 65536;
 
 }  // namespace
 
-LineReader::LineReader(std::FILE* file) : pFileM(file), vPieceM(pieceBytesG) {}
+LineReader::LineReader(int descriptor) : descriptorM(descriptor), vPieceM(pieceBytesG) {}
+
+bool LineReader::FLineReady() const {
+    return endM > nextM && std::memchr(vPieceM.data() + nextM, '\n', endM - nextM) != nullptr;
+}
 
 bool LineReader::Refill() {
     if (fFailedM) return false;
+    ssize_t n = 0;
+    do {
+        n = ::read(descriptorM, vPieceM.data(), vPieceM.size());
+    } while (n < 0 && errno == EINTR);
+    fFailedM = n < 0;
     nextM = 0;
-    endM = std::fread(vPieceM.data(), 1, vPieceM.size(), pFileM);
-    fFailedM = endM == 0 && std::ferror(pFileM) != 0;
+    endM = fFailedM ? 0 : static_cast<size_t>(n);
     return endM != 0;
 }
 

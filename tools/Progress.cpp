@@ -16,15 +16,17 @@ constexpr size_t barColumnsG = 40;
 
 }  // namespace
 
-Progress::Progress(std::FILE* in) : nextShowM(Clock::now() + firstShowG) {
+Progress::Progress(std::FILE* in, std::FILE* out) : nextShowM(Clock::now() + firstShowG) {
     struct stat status {};
-    if (::isatty(STDERR_FILENO) == 1 && ::fstat(::fileno(in), &status) == 0 && S_ISREG(status.st_mode)) {
+    if (::isatty(STDERR_FILENO) == 1 && ::isatty(::fileno(out)) == 0 && ::fstat(::fileno(in), &status) == 0 &&
+        S_ISREG(status.st_mode)) {
         totalM = static_cast<size_t>(status.st_size);
     }
 }
 
-Progress::~Progress() {
+void Progress::Hide() {
     if (fShownM) std::fputs("\r\033[K", stderr);
+    fShownM = false;
 }
 
 void Progress::Advance(size_t nByte) {

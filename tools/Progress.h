@@ -10,13 +10,16 @@ namespace sorn::tools {
 /// file's size is known, and only once the work has taken a second.
 class Progress {
  public:
-    explicit Progress(std::FILE* in);
-    /// Clears the line if it was shown.
-    ~Progress();
+    Progress(std::FILE* in, std::FILE* out);
+    /// Hides the line.
+    ~Progress() { Hide(); }
     Progress(const Progress&) = delete;
     Progress& operator=(const Progress&) = delete;
 
     void Advance(size_t nByte);
+    /// Clears the line if it is shown; to be called before anything else is written on standard error. It
+    /// comes back by itself.
+    void Hide();
 
  private:
     using Clock = std::chrono::steady_clock;

@@ -4,6 +4,7 @@ front of it on a cross build) comes in SORN_TOOL."""
 import json
 import os
 import pty
+import resource
 import shlex
 import subprocess
 import tempfile
@@ -38,13 +39,33 @@ class Usage(unittest.TestCase):
             self.assertEqual((code, out), (WRONG_USAGE, b""), arguments)
             self.assertNotEqual(err, b"", arguments)
 
-    def test_completion_knows_every_option(self):
-        completion = (ROOT / "tools/completion/sorn.bash").read_text()
+    def test_help_of_all(self):
+        code, out, _ = run("--help-all")
+        self.assertEqual(code, DONE)
+        for word in (b"describe", b"convert", b"--json", b"--lines"):
+            self.assertIn(word, out)
+
+    def completions(self, *words):
+        """What bash offers for the last of the words."""
+        with tempfile.TemporaryDirectory() as folder:
+            command = Path(folder, "sorn")
+            command.write_text(f'#!/bin/sh\nexec {shlex.join(TOOL)} "$@"\n')
+            command.chmod(0o755)
+            script = f"""source {ROOT}/tools/completion/sorn.bash
+                COMP_WORDS=({shlex.join([str(command), *words])}); COMP_CWORD={len(words)}
+                _sorn; printf '%s\\n' "${{COMPREPLY[@]}}\""""
+            done = subprocess.run(["bash", "-c", script], capture_output=True, check=True, text=True)
+            self.assertEqual(done.stderr, "")
+            return set(done.stdout.split())
+
+    def test_completion(self):
         for command in ("describe", "convert"):
-            out = run(command, "--help")[1].decode()
-            for word in out.replace(",", " ").split():
-                if word.startswith("--"):
-                    self.assertIn(word, completion, command)
+            helped = run(command, "--help")[1].decode().replace(",", " ").split()
+            options = {word for word in helped if word.startswith("--")}
+            self.assertEqual(self.completions(command, "--"), options, command)
+        self.assertEqual(self.completions("con"), {"convert"})
+        self.assertEqual(self.completions("describe", "recordingS"), {"recordingSearch", "recordingSettings"})
+        self.assertEqual(self.completions("convert", "--road", ""), {"dictionary"})
 
 
 class Describe(unittest.TestCase):
@@ -87,9 +108,26 @@ class Describe(unittest.TestCase):
         key = [field for field in remove["fields"] if field["name"] == "key"][0]
         self.assertEqual((key["firstVersion"], key["lastVersion"]), (26, 42))
         self.assertEqual(key["variants"], [{"slot": 2, "name": "key", "dataType": 17, "arity": 2, "firstVersion": 7,
-                                            "lastVersion": 25, "typeRef": 0}])
+                                            "lastVersion": 25, "typeRef": 0, "variants": []}])
         self.assertEqual(json.loads(run("describe", "--json", "681")[1]),
                          {"id": 681, "name": "channelListType", "count": 3, "names": {"1": "favorites", "2": "received"}})
+
+
+    def test_json_has_every_field_of_the_golden_dump(self):
+        structs = {struct["name"]: struct for struct in json.loads(run("describe", "--json")[1])["structs"]}
+        variants = {(name, field["name"]): (variant["firstVersion"], variant["lastVersion"], variant["arity"], variant["dataType"])
+                    for name, struct in structs.items() for field in struct["fields"] for variant in field["variants"]}
+        self.assertEqual(variants, {("audioStream", "audioStreamFormat"): (7, 21, 1, 7),
+                                    ("audioStream", "audioStreamId"): (7, 21, 1, 9),
+                                    ("localApplicationDataRemove", "key"): (7, 25, 2, 17),
+                                    ("viewStartEvent", "timestampMilliseconds"): (7, 11, 0, 15),
+                                    ("viewStopEvent", "timestampMilliseconds"): (7, 11, 0, 15)})
+
+    def test_full_disk(self):
+        for arguments in (["describe"], ["describe", "ad"], ["describe", "--json"]):
+            with open("/dev/full", "wb") as full:
+                done = subprocess.run([*TOOL, *arguments], stdout=full, stderr=subprocess.PIPE)
+            self.assertEqual((done.returncode, done.stderr), (SOME_REFUSED, b"the output could not be written\n"), arguments)
 
 
 class Convert(unittest.TestCase):
@@ -115,6 +153,34 @@ class Convert(unittest.TestCase):
         self.assertEqual(run("convert", "--schema-version", "43", text=b'{"type":"audioStream"}')[2],
                          b"Unmarshaling to SornObject: given orvo version is out of range used in code generation: \x2b\n")
 
+    def test_older_version_there_and_back(self):
+        text = b'{"audioStreamFormat": "ac3", "audioStreamId": "vuka:aus.7", "type": "audioStream"}\n'
+        for version in ("0", "7", "21", "22", "42"):
+            self.assertEqual(run("convert", "--road", "dictionary", "--schema-version", version, text=text), (DONE, text, b""))
+
+    def test_deep_record_on_a_small_stack(self):
+        depth = 100000
+        head = b'{"cause": ' * depth
+        inner = b'{"code": "badArgument", "text": "t", "type": "error"}'
+        text = head + inner + b', "code": "badArgument", "text": "t", "type": "error"}' * depth + b"\n"
+        small = lambda: resource.setrlimit(resource.RLIMIT_STACK, (256 * 1024, 256 * 1024))
+        limit = {} if len(TOOL) > 1 else {"preexec_fn": small}  # an emulator needs a stack of its own
+        done = subprocess.run([*TOOL, "convert"], input=text, capture_output=True, timeout=300, **limit)
+        self.assertEqual((done.returncode, done.stdout == text, done.stderr), (DONE, True, b""))
+
+    def test_lines_pretty(self):
+        text = b'{"type":"success"}\n{"type":"success"}\n'
+        self.assertEqual(run("convert", "--lines", "--pretty", text=text)[1], b'{\n    "type": "success"\n}\n' * 2)
+
+    def test_lines_with_carriage_returns(self):
+        self.assertEqual(run("convert", "--lines", text=b'{"type":"success"}\r\n'), (DONE, b'{"type": "success"}\n', b""))
+
+    def test_lines_go_out_while_the_next_is_awaited(self):
+        with subprocess.Popen([*TOOL, "convert", "--lines"], stdin=subprocess.PIPE, stdout=subprocess.PIPE, bufsize=0) as tool:
+            for _ in range(2):
+                tool.stdin.write(b'{"type":"success"}\n')
+                self.assertEqual(tool.stdout.readline(), b'{"type": "success"}\n')
+
     def test_lines(self):
         text = b'{"type":"success"}\nnonsense\n{"type":"updateTemplate","fieldNumber":1}\n\n{"type":"success"}'
         code, out, err = run("convert", "--lines", text=text)
@@ -137,10 +203,23 @@ class Convert(unittest.TestCase):
             self.assertEqual(target.read_bytes(), b'{"type": "success"}\n')
             self.assertEqual(run("convert", folder)[0], SOME_REFUSED)
 
+    def test_output_onto_the_input(self):
+        with tempfile.TemporaryDirectory() as folder:
+            file = Path(folder, "in.json")
+            file.write_bytes(b'{"type":"success"}')
+            code, _, err = run("convert", "-o", str(file), str(file))
+            self.assertEqual((code, err), (WRONG_USAGE, f"{file}: is the input, too\n".encode()))
+            self.assertEqual(file.read_bytes(), b'{"type":"success"}')
+
     def test_full_disk(self):
+        words = b"the output could not be written\n"
         code, _, err = run("convert", "-o", "/dev/full", text=b'{"type":"success"}')
         self.assertEqual(code, SOME_REFUSED)
-        self.assertIn(b"could not be written", err)
+        self.assertIn(words, err)
+        with open("/dev/full", "wb") as full:
+            done = subprocess.run([*TOOL, "convert", "--lines"], input=b'{"type":"success"}\n' * 3, stdout=full,
+                                  stderr=subprocess.PIPE)
+        self.assertEqual((done.returncode, done.stderr), (SOME_REFUSED, words))
 
     def test_examples_come_back_unchanged(self):
         files = sorted((ROOT / "examples/data").glob("*.jsonl"))
@@ -156,10 +235,10 @@ class Convert(unittest.TestCase):
         self.assertGreaterEqual(records, 200)
         self.assertGreaterEqual(len(types), 15)
 
-    def test_progress_only_on_a_terminal(self):
-        line = b'{"fieldName": "' + b"x" * 1000 + b'", "type": "responseTemplateFieldInfo"}\n'
+    def shown_on_terminal(self, text):
+        """What the tool shows on a terminal while it works on the text for more than a second; and its output."""
         with tempfile.NamedTemporaryFile() as file:
-            file.write(line * 1000)
+            file.write(text)
             file.flush()
             leader, follower = pty.openpty()
             with subprocess.Popen([*TOOL, "convert", "--lines", file.name], stdout=subprocess.PIPE, stderr=follower) as tool:
@@ -169,10 +248,20 @@ class Convert(unittest.TestCase):
                 out = first + tool.stdout.read()
             shown = os.read(leader, 65536)
             os.close(leader)
-            self.assertEqual((tool.returncode, out), (DONE, line * 1000))
-            self.assertRegex(shown, rb"^\r\[#*\.*\] +[0-9]+ %")
-            self.assertTrue(shown.endswith(b"\r\x1b[K"), shown[-80:])
-            self.assertEqual(run("convert", "--lines", file.name)[2], b"")
+            return shown, out
+
+    def test_progress_only_on_a_terminal(self):
+        line = b'{"fieldName": "' + b"x" * 1000 + b'", "type": "responseTemplateFieldInfo"}\n'
+        shown, out = self.shown_on_terminal(line * 1000)
+        self.assertEqual(out, line * 1000)
+        self.assertRegex(shown, rb"^\r\[#*\.*\] +[0-9]+ %")
+        self.assertTrue(shown.endswith(b"\r\x1b[K"), shown[-80:])
+        self.assertEqual(run("convert", "--lines", text=line * 1000)[2], b"")
+
+    def test_words_stand_behind_a_cleared_bar(self):
+        line = b'{"fieldName": "' + b"x" * 1000 + b'", "type": "responseTemplateFieldInfo"}\n'
+        shown, _ = self.shown_on_terminal(line * 900 + b"[]\n" + line)
+        self.assertIn(b"%\r\x1b[Kline 901: JSON must start with '{'.\r\n", shown)
 
 
 if __name__ == "__main__":

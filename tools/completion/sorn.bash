@@ -10,10 +10,10 @@ _sorn() {
         --road) mapfile -t COMPREPLY < <(compgen -W 'dictionary' -- "$word"); return ;;
     esac
     case $command:$word in
-        describe:-*) mapfile -t COMPREPLY < <(compgen -W '--json --help' -- "$word") ;;
-        describe:*) mapfile -t COMPREPLY < <(compgen -W "$(sorn describe | awk '{print $3}')" -- "$word") ;;
+        describe:-*) mapfile -t COMPREPLY < <(compgen -W '--json --help --help-all' -- "$word") ;;
+        describe:*) mapfile -t COMPREPLY < <(compgen -W "$("${COMP_WORDS[0]}" describe 2>/dev/null | awk '{print $3}')" -- "$word") ;;
         convert:-*)
-            mapfile -t COMPREPLY < <(compgen -W '--from --to --road --schema-version --pretty --lines --output --help' -- "$word")
+            mapfile -t COMPREPLY < <(compgen -W '--from --to --road --schema-version --pretty --lines --output --help --help-all' -- "$word")
             ;;
         convert:*) mapfile -t COMPREPLY < <(compgen -f -- "$word") ;;
     esac
