@@ -1,5 +1,6 @@
 #include <CLI/CLI.hpp>
-#include <string>
+#include <cstdio>
+#include <exception>
 
 #include "tools/Convert.h"
 #include "tools/Describe.h"
@@ -44,9 +45,7 @@ void AddConvert(CLI::App& app, sorn::tools::ConvertOptions& options) {
     command->add_option("IN", options.inPath, "Input file (default: standard input)")->option_text("IN");
 }
 
-}  // namespace
-
-int main(int argc, char** argv) {
+int Run(int argc, char** argv) {
     CLI::App app{"The records of a digital video recorder platform: looks at their schema and converts them",
                  "sorn"};
     app.require_subcommand(1);
@@ -61,4 +60,15 @@ int main(int argc, char** argv) {
         return app.exit(error) == 0 ? sorn::tools::DONE : sorn::tools::WRONG_USAGE;
     }
     return app.got_subcommand("describe") ? sorn::tools::Describe(describe) : sorn::tools::Convert(convert);
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    try {
+        return Run(argc, argv);
+    } catch (const std::exception& failure) {
+        std::fprintf(stderr, "%s\n", failure.what());
+        return sorn::tools::SOME_REFUSED;
+    }
 }
