@@ -88,6 +88,21 @@ TEST_F(ArrayValueTest, RemoveTakesTheFirstOfThatPointer) {
     EXPECT_EQ(once->GetRefCount(), 1u);
 }
 
+TEST_F(ArrayValueTest, RemoveOfANullTakesTheFirstNull) {
+    const ref<ArrayValue> array = Array();
+    const ref<StringValue> text = StringValue::Make("text", &pool);
+    array->Add(ref<DictValue>());
+    array->Add(text);
+    array->Add(ref<DictValue>());
+    EXPECT_TRUE(array->Remove(2));
+    ASSERT_EQ(array->CountValues(), 2u);
+    EXPECT_EQ(array->GetValueAt(0).get(), text.get());
+    EXPECT_EQ(array->GetValueAt(1), nullptr);
+    EXPECT_TRUE(array->Remove(1));
+    ASSERT_EQ(array->CountValues(), 1u);
+    EXPECT_EQ(array->GetValueAt(0).get(), text.get());
+}
+
 TEST_F(ArrayValueTest, EqualInOrder) {
     EXPECT_TRUE(FEqual(Array(), Array()));
     EXPECT_TRUE(FEqual(ArrayOf({"a", "b"}), ArrayOf({"a", "b"})));

@@ -1,5 +1,8 @@
 #include "sorn/dict/Base64.h"
 
+#include <cstring>
+#include <memory>
+
 #include "DictFixture.h"
 
 namespace {
@@ -188,6 +191,28 @@ TEST_F(Base64Test, AllLengthsBothWays) {
         std::string damaged = text;
         damaged[random.Below(text.size() - 2)] = '*';
         ASSERT_EQ(Decoded(standard, damaged), "refused") << damaged;
+    }
+}
+
+TEST_F(Base64Test, PlainMemoryOfExactSize) {
+    // In blocks of just their size a read or write outside is a report of AddressSanitizer.
+    Random random(3);
+    for (unsigned n = 0; n < 40; ++n) {
+        const std::unique_ptr<unsigned char[]> bytes(new unsigned char[n]);
+        for (unsigned i = 0; i < n; ++i) bytes[i] = static_cast<unsigned char>(random.Below(256));
+        const std::string expected = EncodedByBits(std::string(bytes.get(), bytes.get() + n));
+        const unsigned nText = static_cast<unsigned>(Base64::EncodedLength(n));
+        ASSERT_EQ(nText, expected.size());
+        const std::unique_ptr<unsigned char[]> text(new unsigned char[nText]);
+        standard.Encode(bytes.get(), n, text.get());
+        EXPECT_EQ(std::string(text.get(), text.get() + nText), expected);
+        const ref<rox::ByteBuffer> back = standard.Decode(&pool, text.get(), nText);
+        ASSERT_NE(back, nullptr);
+        EXPECT_EQ(Str(back), std::string(bytes.get(), bytes.get() + n));
+        if (nText == 0) continue;
+        const std::unique_ptr<unsigned char[]> cut(new unsigned char[nText - 1]);
+        std::memcpy(cut.get(), text.get(), nText - 1);
+        EXPECT_EQ(standard.Decode(&pool, cut.get(), nText - 1), nullptr);
     }
 }
 

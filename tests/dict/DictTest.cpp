@@ -1,6 +1,7 @@
 #include "sorn/dict/Dict.h"
 
 #include "DictFixture.h"
+#include "rox/RoxArray.h"
 #include "rox/VkCast.h"
 #include "sorn/dict/ArrayValue.h"
 #include "sorn/dict/Dictionary.h"
@@ -270,6 +271,104 @@ TEST_F(DictTest, AFullArrayRefuses) {
     EXPECT_EQ(pool.GetUsedBytes(), used) << "a refused value is still alive";
     EXPECT_EQ(dict->CountValues("n"), 65'535u);
     EXPECT_EQ(Str(dict->GetString("n", 65'534)), "last");
+}
+
+TEST_F(DictTest, ArgumentsThatLieInWhatTheOperationRemoves) {
+    // Several values under one name of the dictionary: the next one that is added takes them all away.
+    const auto dictWith = [this](const ref<DictValue>& second) {
+        const ref<Dict> dict = MakeDict(&pool);
+        dict->GetDictionary()->Add(Text("name"), Text("a first text that is long"));
+        dict->GetDictionary()->Add(Text("name"), second);
+        return dict;
+    };
+    const auto secondOf = [this](const ref<Dict>& dict) {
+        RoxArray<DictValue> values(&pool);
+        dict->GetDictionary()->GetRange(Text("name"), values);
+        return values[1];
+    };
+    const ref<Dict> texts = dictWith(StringValue::Make("a second text that is long", &pool));
+    EXPECT_TRUE(texts->AddString(Text("name"), static_cast<StringValue*>(secondOf(texts))->GetValue()));
+    EXPECT_EQ(Texts(texts, "name"), Strings({"a first text that is long", "a second text that is long"}));
+
+    const ref<Dict> named = dictWith(StringValue::Make("name", &pool));
+    EXPECT_TRUE(named->AddString(static_cast<StringValue*>(secondOf(named))->GetValue(), Text("third")));
+    EXPECT_EQ(Texts(named, "name"), Strings({"a first text that is long", "third"}));
+
+    const ref<Dict> lazies = dictWith(ref<DictValue>(new (&pool) LazyDictValue(Lazy("{\"k\":\"v\"}"))));
+    EXPECT_TRUE(lazies->AddLazyDict(Text("name"), static_cast<LazyDictValue*>(secondOf(lazies))->GetValue()));
+    EXPECT_EQ(Str(lazies->GetDict("name", 1)->GetString("k", 0)), "v");
+
+    const ref<Dict> owner = MakeDict(&pool);
+    owner->AddString("k", "v");
+    const ref<Dict> dicts = dictWith(ref<DictValue>(owner->GetDictionary()));
+    EXPECT_TRUE(dicts->AddDict(Text("name"), owner));
+    EXPECT_EQ(Str(dicts->GetDict("name", 1)->GetString("k", 0)), "v");
+}
+
+TEST_F(DictTest, RemoveOfAnElementThatIsTheName) {
+    const ref<Dict> dict = MakeDict(&pool);
+    const ref<ArrayValue> array(new (&pool) ArrayValue);
+    array->Add(StringValue::Make("the name of the array", &pool));
+    dict->GetDictionary()->Add(Text("the name of the array"), array);
+    dict->Remove(static_cast<StringValue*>(array->At(0))->GetValue(), 0);
+    EXPECT_EQ(dict->CountNames(), 0u);
+    EXPECT_EQ(array->CountValues(), 0u);
+}
+
+TEST_F(DictTest, ANullNameIsTheEmptyName) {
+    const char* const null = nullptr;
+    const ref<Dict> dict = MakeDict(&pool);
+    testing::internal::CaptureStderr();
+    EXPECT_EQ(Str(dict->GetLazyDict(null, 2)->GetStoredBytes()), "{}");
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "Dict::GetValueFromWrapper: field [2] not found");
+    EXPECT_EQ(dict->CountValues(null), 0u);
+    EXPECT_TRUE(dict->AddString(null, null));
+    EXPECT_EQ(dict->CountValues(""), 1u);
+    EXPECT_EQ(dict->CountValues(null), 1u);
+    EXPECT_NE(dict->FindValue(null, 0), nullptr);
+    EXPECT_EQ(Str(dict->GetString(null, 0)), "");
+    EXPECT_EQ(dict->GetDict(null, 0)->CountNames(), 0u);
+    EXPECT_EQ(dict->GetType(null, 0), 0);
+    bool isLazy = true;
+    EXPECT_EQ(dict->GetType(null, 0, isLazy), 0);
+    EXPECT_FALSE(isLazy);
+    EXPECT_EQ(dict->GetDictionary()->Find(null), dict->GetDictionary()->Find(""));
+    EXPECT_TRUE(dict->AddDict(null, MakeDict(&pool)));
+    EXPECT_TRUE(dict->AddLazyDict(null, Lazy("{}")));
+    EXPECT_EQ(dict->CountValues(""), 3u);
+    dict->Remove(null, 1);
+    EXPECT_EQ(dict->CountValues(""), 2u);
+    dict->Remove(null);
+    EXPECT_EQ(dict->CountNames(), 0u);
+}
+
+TEST_F(DictTest, ANullReferenceCountsAsNoValue) {
+    const ref<Dict> dict = MakeDict(&pool);
+    dict->GetDictionary()->Add(Text("n"), ref<DictValue>());
+    EXPECT_EQ(dict->CountValues("n"), 0u);
+    EXPECT_EQ(dict->CountNames(), 1u);
+    EXPECT_EQ(dict->FindValue("n", 0), nullptr);
+    EXPECT_EQ(dict->GetType("n", 0), 2);
+}
+
+TEST_F(DictTest, Bytestrings) {
+    const ref<Dict> dict = MakeDict(&pool);
+    dict->AddString("b", "2");
+    dict->AddString("a", "\x01");
+    EXPECT_EQ(Str(dict->ToBytestring(false)), "{\"a\": \"\\u0001\", \"b\": \"2\"}");
+    EXPECT_EQ(Str(dict->ToBytestring(true)), "{\n    \"a\": \"\\u0001\", \n    \"b\": \"2\"\n}");
+    EXPECT_EQ(dict->ToBytestring(false)->GetMempool(), &pool);
+    EXPECT_EQ(Str(MakeDict(&pool)->ToBytestring(false)), "{}");
+
+    EXPECT_EQ(Str(Dict::FormatBytestring(&pool, Bytes("foob"))), "Zm9vYg==");
+    EXPECT_EQ(Str(Dict::FormatBytestring(&pool, Bytes(""))), "");
+    EXPECT_EQ(Str(Dict::FormatBytestring(&pool, nullptr)), "");
+    EXPECT_EQ(Str(Dict::ParseBytestring(&pool, Text("Zm9vYg=="))), "foob");
+    for (const char* text : {"", "Zm9vY", "Zm9v\n", "****"}) {
+        const ref<rox::ByteBuffer> bytes = Dict::ParseBytestring(&pool, Text(text));
+        ASSERT_NE(bytes, nullptr) << text;
+        EXPECT_EQ(bytes->GetLength(), 0u) << text;
+    }
 }
 
 }  // namespace

@@ -363,4 +363,46 @@ TEST_F(DictionaryTest, PushSortedLeavesWhatIsOnTheStack) {
     EXPECT_EQ(all, "abc");
 }
 
+TEST_F(DictionaryTest, RangesTellWhenTheArrayIsFull) {
+    const ref<Dictionary> dictionary = Make({{"x", "first"}, {"x", "second"}});
+    const ref<StringValue> filler = StringValue::Make("", &pool);
+    RoxArray<DictValue> values(&pool);
+    RoxStringArray texts(&pool);
+    EXPECT_TRUE(dictionary->GetRange(Text("x"), values));
+    EXPECT_TRUE(dictionary->GetStringRange(Text("x"), texts));
+    while (values.GetCount() < 65'534) values.Add(filler);
+    while (texts.GetCount() < 65'534) texts.Add(Text(""));
+    EXPECT_FALSE(dictionary->GetRange(Text("x"), values));
+    EXPECT_FALSE(dictionary->GetStringRange(Text("x"), texts));
+    ASSERT_EQ(values.GetCount(), 65'535u);
+    ASSERT_EQ(texts.GetCount(), 65'535u);
+    EXPECT_EQ(values[65'534], dictionary->Find("x"));
+    EXPECT_EQ(Str(texts[65'534]), "first");
+    // Nothing to add fits.
+    dictionary->Add(Text("d"), Make());
+    EXPECT_TRUE(dictionary->GetRange(Text("unknown"), values));
+    EXPECT_TRUE(dictionary->GetStringRange(Text("unknown"), texts));
+    EXPECT_TRUE(dictionary->GetStringRange(Text("d"), texts));
+    EXPECT_FALSE(dictionary->GetRange(Text("d"), values));
+}
+
+TEST_F(DictionaryTest, ADictionaryThatWasLargeCostsWhatIsLeft) {
+    const ref<Dictionary> dictionary = Make();
+    const auto name = [this](int i) { return Text("name" + std::to_string(i)); };
+    for (int i = 0; i < 100'000; ++i) dictionary->Add(name(i), Text("v"));
+    for (int i = 0; i < 100'000; ++i) {
+        if (i != 777) dictionary->Remove(name(i));
+    }
+    EXPECT_LT(pool.GetUsedBytes(), 4096u) << "it keeps the size that it had";
+    EXPECT_EQ(Names(dictionary), Strings({"name777"}));
+    EXPECT_EQ(dictionary->CountNames(), 1u);
+    EXPECT_TRUE(FEqual(dictionary, Make({{"name777", "v"}})));
+    EXPECT_FALSE(FEqual(dictionary, Make({{"name778", "v"}})));
+    EXPECT_EQ(Str(dictionary->ToJson(false)), R"({"name777": "v"})");
+    dictionary->Add(Text("name777"), Text("w"));
+    dictionary->Add(Text("another"), Text("x"));
+    EXPECT_EQ(Texts(dictionary, "name777"), Strings({"v", "w"}));
+    EXPECT_EQ(Names(dictionary), Strings({"another", "name777"}));
+}
+
 }  // namespace

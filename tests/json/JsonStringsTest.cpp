@@ -273,4 +273,36 @@ TEST(JsonStrings, ReadAndWriteAgain) {
     }
 }
 
+/// Each run of bytes from `run`, at all short lengths, ends at each byte that is not in `inside`, and at the
+/// end of the block.
+void ExpectRunsEnd(const unsigned char* (*find)(const unsigned char*, const unsigned char*),
+                   const std::string& inside, const std::string& run) {
+    for (unsigned n = 0; n < 70; ++n) {
+        std::string text;
+        for (unsigned i = 0; i < n; ++i) text += run[(i * 7 + n) % run.size()];
+        const ExactBytes alone(text);
+        ASSERT_EQ(find(alone.Begin(), alone.End()), alone.End()) << n;
+        for (unsigned byte = 0; byte < 256; ++byte) {
+            if (inside.find(static_cast<char>(byte)) != std::string::npos) continue;
+            for (const unsigned nBehind : {0u, 1u, 20u}) {
+                const ExactBytes bytes(text + static_cast<char>(byte) + std::string(nBehind, run[0]));
+                ASSERT_EQ(find(bytes.Begin(), bytes.End()), bytes.Begin() + n) << n << " " << byte;
+            }
+        }
+    }
+}
+
+TEST(JsonStrings, RunsOfWhiteSpaceOfAnyLength) {
+    const std::string white = " \t\n\r";
+    ExpectRunsEnd(&sorn::textscan::SkipWhitespace, white, " ");
+    ExpectRunsEnd(&sorn::textscan::SkipWhitespace, white, white);
+    const unsigned char bytes[2] = {' ', ' '};
+    EXPECT_EQ(sorn::textscan::SkipWhitespace(bytes + 1, bytes), bytes + 1);
+}
+
+TEST(JsonStrings, RunsThatNeedNoQuotesOfAnyLength) {
+    const std::string bare = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789-";
+    ExpectRunsEnd(&sorn::textscan::FindBareEnd, bare, bare);
+}
+
 }  // namespace

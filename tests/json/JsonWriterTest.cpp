@@ -1,5 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <string>
+
 #include "json/Support.h"
 #include "kelbaselib/ByteCountingBytesink.h"
 #include "sorn/dict/RoxByteBuffer.h"
@@ -273,6 +276,44 @@ TEST_F(JsonWriter, Bytestring) {
     const ref<rox::ByteBuffer> pretty = dictionary->ToBytestring(true);
     EXPECT_EQ(std::string(reinterpret_cast<const char*>(pretty->GetData()), pretty->GetLength()),
               "{\n    \"a\": \"x\\u0000y\"\n}");
+}
+
+/// Takes so many bytes in all, and counts how often it is written to.
+class FullSink final : public kelbaselib::Bytesink {
+ public:
+    explicit FullSink(size_t room) : roomM(room) {}
+    unsigned Write(const void* bytes, unsigned count) override {
+        ++nWritesM;
+        const unsigned n = static_cast<unsigned>(std::min<size_t>(count, roomM));
+        textM.append(static_cast<const char*>(bytes), n);
+        roomM -= n;
+        return n;
+    }
+    const std::string& GetText() const { return textM; }
+    unsigned CountWrites() const { return nWritesM; }
+
+ private:
+    std::string textM;
+    size_t roomM;
+    unsigned nWritesM = 0;
+};
+
+TEST_F(JsonWriter, AFullSinkGetsNothingMore) {
+    const ref<ArrayValue> array = NewArray();
+    for (unsigned i = 0; i < 100; ++i) array->Add(Text(poolM, std::string(500, 'x')));
+    const std::string text = Write(*array);
+    ASSERT_EQ(text.size(), 2u + 100 * 502 + 99 * 2);
+    for (const size_t room : {size_t{0}, size_t{1}, size_t{5000}, text.size() - 1, text.size()}) {
+        FullSink sink(room);
+        array->ToJson(sink, JsonFormat(false));
+        EXPECT_EQ(sink.GetText(), text.substr(0, room));
+        // Pieces come until one is not taken whole; a room that ends with a piece costs one write more.
+        EXPECT_LE(sink.CountWrites(), room / 3000 + 1) << room;
+        EXPECT_GE(sink.CountWrites(), room / 4096 + (room % 4096 != 0 ? 1 : 0)) << room;
+    }
+    FullSink none(0);
+    array->ToJson(none, JsonFormat(false));
+    EXPECT_EQ(none.CountWrites(), 1u);
 }
 
 }  // namespace

@@ -70,7 +70,10 @@ inline std::string Parse(std::string_view text) {
     RoxString error("left from before");
     const ref<sorn::Dictionary> dictionary =
         sorn::Dictionary::FromJson(bytes.Begin(), bytes.Size(), error, &pool);
-    if (dictionary == nullptr) return "error: " + String(error);
+    if (dictionary == nullptr) {
+        // The words lie on the general heap, as the string did that they replace.
+        return pool.GetUsedBytes() == 0 ? "error: " + String(error) : "bytes left behind after a failure";
+    }
     return error.FEmpty() ? String(dictionary->ToJson(false)) : "words without failure: " + String(error);
 }
 

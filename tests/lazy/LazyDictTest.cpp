@@ -158,6 +158,49 @@ TEST_F(LazyDictTest, TheSourceIsReleasedOnceAndNotReadBefore) {
     EXPECT_EQ(counts.releases, 1 + counts.newSources);
 }
 
+TEST_F(LazyDictTest, NewTakesItsMembersAndTheVersion) {
+    const ref<Dict> dict = MakeDict(&pool);
+    const ref<rox::ByteBuffer> bytes = Bytes("{}", 2);
+    const ref<SornObject> object = EveryTypeCompanion::Factory(&pool);
+    CountingSource::Counts counts;
+    CountingSource* const source = new CountingSource(counts);
+    {
+        const ref<LazyDict> lazy =
+            LazyDict::New(&pool, LazyDict::REP_OBJECT, dict, bytes, object, source, 17);
+        EXPECT_EQ(lazy->GetRep(), LazyDict::REP_OBJECT);
+        EXPECT_EQ(lazy->GetStoredDict(), dict);
+        EXPECT_EQ(lazy->GetStoredBytes(), bytes);
+        EXPECT_EQ(lazy->GetStoredObject(), object);
+        EXPECT_EQ(lazy->GetStoredBytesource(), source);
+        EXPECT_EQ(lazy->GetStoredDictionary(), nullptr);
+        EXPECT_EQ(lazy->GetVersion(), OrvoVersion(17));
+        EXPECT_EQ(dict->GetRefCount(), 2u);
+        EXPECT_EQ(counts.releases, 0);
+    }
+    EXPECT_EQ(counts.releases, 1);
+    EXPECT_EQ(counts.reads, 0);
+    EXPECT_EQ(dict->GetRefCount(), 1u);
+}
+
+TEST_F(LazyDictTest, ABodyWithoutItsSource) {
+    const ref<LazyDict> lazy = LazyDict::FromBytesource(&pool, nullptr, 3);
+    EXPECT_EQ(lazy->GetRep(), LazyDict::REP_BYTESOURCE);
+    EXPECT_EQ(lazy->GetStoredBytesource(), nullptr);
+    EXPECT_EQ(WordsOf(lazy), "byte source was not read");
+    EXPECT_EQ(JsonOf(lazy, false), "before ");
+}
+
+TEST_F(LazyDictTest, FromJsonStringCopiesTheText) {
+    const char json[] = "{\"a\": \"\xC3\xA9\"}";
+    const RoxString text(json);
+    const ref<LazyDict> lazy = LazyDict::FromJsonString(&pool, text, 0);
+    const ref<rox::ByteBuffer>& bytes = lazy->GetStoredBytes();
+    ASSERT_EQ(bytes->GetLength(), sizeof json - 1);
+    EXPECT_EQ(std::memcmp(bytes->GetData(), json, sizeof json - 1), 0);
+    EXPECT_NE(static_cast<const void*>(bytes->GetData()), static_cast<const void*>(text.Utf8()));
+    EXPECT_EQ(bytes->GetMempool(), &pool);
+}
+
 TEST_F(LazyDictTest, ToDictOfEachForm) {
     ref<SornObject> object = Object(R"({"type": "everyTypeCompanion", "number": 5})");
     const char* const json = R"({"number": 5, "type": "everyTypeCompanion"})";
@@ -227,8 +270,7 @@ TEST_F(LazyDictTest, BodiesWithoutTheirMember) {
     for (LazyDict::Rep rep :
          {LazyDict::REP_DICT, LazyDict::REP_JSON, LazyDict::REP_OBJECT, LazyDict::REP_DICTIONARY}) {
         ref<LazyDict> lazy = LazyDict::New(&pool, rep, nullptr, nullptr, nullptr, nullptr, 0);
-        RoxString error;
-        EXPECT_EQ(lazy->ToDictionary(error), nullptr);
+        EXPECT_EQ(WordsOf(lazy), "");
         EXPECT_EQ(Text(lazy->ToDict()->GetString("type", 0)), "error");
         EXPECT_EQ(JsonOf(lazy, false), "before ");
     }
@@ -277,13 +319,14 @@ TEST_F(LazyDictTest, WhatDynamicValuesAskOfABody) {
     EXPECT_FALSE(FEqualLazyBodies(none, text));
     EXPECT_FALSE(FEqualLazyBodies(text, none));
     EXPECT_TRUE(FEqualLazyBodies(text, FromText(R"({"a":1})")));
-    ByteBuffer out(&pool);
-    WriteLazyBody(none, out, false);
-    WriteLazyBody(text, out, false);
-    WriteLazyBody(text, out, true);
-    EXPECT_EQ(std::string(reinterpret_cast<const char*>(out.GetData()), out.GetLength()),
-              "null{ \"a\" : 1}{\n    \"a\": 1\n}");
+    ref<rox::ByteBuffer> bytes;
+    EXPECT_EQ(LazyBodyToWrite(text, false, bytes), nullptr);
+    EXPECT_EQ(bytes, text->GetStoredBytes());
+    const ref<Dictionary> parsed = LazyBodyToWrite(text, true, bytes);
+    EXPECT_EQ(bytes, nullptr);
+    EXPECT_EQ(Text(parsed->ToJson(false)), R"({"a": 1})");
     ref<Dictionary> dictionary = Parse("{}");
+    EXPECT_EQ(LazyBodyToWrite(NewLazyBody(&pool, dictionary, 0), false, bytes), dictionary);
     EXPECT_EQ(NewLazyBody(&pool, dictionary, 7)->GetStoredDictionary(), dictionary);
     EXPECT_EQ(NewLazyBody(&pool, dictionary, 7)->GetVersion(), OrvoVersion(7));
     EXPECT_EQ(NewEmptyLazyBody(&pool)->GetRep(), LazyDict::REP_JSON);

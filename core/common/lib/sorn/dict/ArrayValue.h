@@ -16,7 +16,8 @@ class NullValue;
 class StringValue;
 
 /// A list of values, in order; at most 65,535 of them, the runtime's limit for containers. The operations
-/// that add give false, and change nothing, when the list is full.
+/// that add give false, and change nothing, when the list is full. A list must not come to hold itself, at
+/// any depth: walks over it would not end, and it would never be destroyed.
 class ArrayValue final : public DictValue {
  public:
     static const char classTagG;

@@ -34,7 +34,8 @@ class Base64 {
 
     constexpr bool FCodeSetBad() const { return isCodeSetBadM; }
 
-    /// `output` becomes a new buffer in the pool with the text of the bytes.
+    /// `output` becomes a new buffer in the pool with the text of the bytes: at most 3,221,225,469 of them,
+    /// RoxAssertFail beyond.
     void Encode(RoxMempool* pool, const ref<rox::ByteBuffer>& input, ref<rox::ByteBuffer>& output) const;
     /// `output` becomes a new buffer in the pool with the bytes of the text; untouched on false. Bits below
     /// the last byte of a padded text are dropped unseen, and what stands behind a terminator in third place
@@ -60,7 +61,8 @@ class Base64 {
     unsigned char terminatorM;
 };
 
-/// The text of the bytes in the default set, in the pool. A null buffer counts as empty.
+/// The text of the bytes in the default set, in the pool, with the limit of Base64::Encode. A null buffer
+/// counts as empty.
 RoxString EncodeBase64(RoxMempool* pool, const ref<rox::ByteBuffer>& bytes);
 /// The bytes of a text in the default set, in the pool: never null, empty for bad text.
 ref<rox::ByteBuffer> DecodeBase64(RoxMempool* pool, const RoxString& text);

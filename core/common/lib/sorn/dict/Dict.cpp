@@ -23,9 +23,12 @@ bool AddToDictOrArray(Dictionary& dictionary, RoxMempool* pool, const RoxString&
     const ref<DictValue> old = dictionary.Get(name);
     if (old == nullptr) return dictionary.Add(name, value);
     if (old->GetTag() == dictvalue::ARRAY) return static_cast<ArrayValue*>(old.get())->Add(value);
+    // The name and the value may lie in what is removed: under a name of several values all go.
+    const RoxString heldName = name;
+    const T heldValue = value;
     const ref<ArrayValue> array(new (pool) ArrayValue(pool));
-    dictionary.Remove(name);
-    return dictionary.Add(name, array) && array->Add(old) && array->Add(value);
+    dictionary.Remove(heldName);
+    return dictionary.Add(heldName, array) && array->Add(old) && array->Add(heldValue);
 }
 
 RoxString TextOf(DictValue* value, RoxMempool* pool) {
@@ -126,7 +129,8 @@ ref<LazyDict> Dict::GetLazyDict(const RoxString& name, unsigned index) const {
 }
 
 ref<LazyDict> Dict::GetLazyDict(const char* name, unsigned index) const {
-    return LazyBodyOf(namedvalue::At(dictionaryM->Find(name), index), GetMempool(), name, index);
+    return LazyBodyOf(namedvalue::At(dictionaryM->Find(name), index), GetMempool(),
+                      name != nullptr ? name : "", index);
 }
 
 int Dict::GetType(const RoxString& name, unsigned index, bool& isLazy) const {
@@ -191,8 +195,10 @@ void Dict::Remove(const RoxString& name, unsigned index) {
     const ref<DictValue> value = dictionaryM->Get(name);
     if (value != nullptr && value->GetTag() == dictvalue::ARRAY) {
         auto* const array = static_cast<ArrayValue*>(value.get());
+        const RoxString heldName = name;  // it may be the text of the element
         array->Remove(index);
-        if (array->CountValues() != 0) return;
+        if (array->CountValues() == 0) dictionaryM->Remove(heldName);
+        return;
     }
     dictionaryM->Remove(name);
 }

@@ -18,8 +18,9 @@ class Dictionary;
 
 /// The handle that applications and codecs use for dynamic records. It wraps a Dictionary, which may be
 /// shared, and gives it one value per name: a second value under a name turns that name's value into an
-/// array. It also owns the text forms of all scalars. Absence gives empty forms, never null and never an
-/// error. One thread at a time.
+/// array. A null reference that a program put under a name through the Dictionary counts as no value. It also
+/// owns the text forms of all scalars. Absence gives empty forms, never null and never an error; a null
+/// `const char*` is the empty text. One thread at a time.
 class Dict : public RoxCore {
  public:
     static const char classTagG;
@@ -66,6 +67,7 @@ class Dict : public RoxCore {
     ref<rox::ByteBuffer> ToBytestring(bool pretty) const;
 
     // Changing. False, and no change, when the name's array is full (65,535 values) or the reference is null.
+    // Names and values may be parts of what the operation removes.
 
     bool AddString(const RoxString& name, const RoxString& text);
     bool AddString(const char* name, const char* text);
@@ -107,8 +109,9 @@ class Dict : public RoxCore {
     /// form.
     static RoxString FormatFloat(RoxMempool* pool, double value);
     static double ParseFloat(RoxMempool* pool, const RoxString& text);  ///< sscanf with "%lg"
-    static RoxString FormatBytestring(RoxMempool* pool, const ref<rox::ByteBuffer>& bytes);  ///< Base64
-    static ref<rox::ByteBuffer> ParseBytestring(RoxMempool* pool, const RoxString& text);    ///< never null
+    /// Base64, as EncodeBase64 and with its limit; the empty text for a null buffer.
+    static RoxString FormatBytestring(RoxMempool* pool, const ref<rox::ByteBuffer>& bytes);
+    static ref<rox::ByteBuffer> ParseBytestring(RoxMempool* pool, const RoxString& text);  ///< never null
     /// Top 16 bits a namespace code, low 48 bits a number: the bare number for code 0, else the namespace's
     /// name, a point and the number; "xxx" stands for a code without a name.
     static RoxString FormatLongId(RoxMempool* pool, unsigned long long value);

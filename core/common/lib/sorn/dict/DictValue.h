@@ -42,7 +42,8 @@ class DictValue : public RoxCore {
     virtual bool Equals(const ref<DictValue>& other) const = 0;
     /// Appends the JSON text of the value.
     virtual void ToJson(ByteBuffer& out, JsonFormat format) const = 0;
-    /// Writes the same bytes to a sink.
+    /// Writes the same bytes to a sink, in pieces. Once the sink takes less of a piece than it is given, it
+    /// gets nothing more: it has the text's beginning then, and who must know asks the sink.
     virtual void ToJson(kelbaselib::Bytesink& out, JsonFormat format) const = 0;
     /// The whole JSON text of the value, in the value's pool.
     virtual RoxString ToJson(bool pretty) const;

@@ -101,18 +101,21 @@ DictValue* Dictionary::Find(const RoxString& name) const {
 }
 
 DictValue* Dictionary::Find(const char* name) const {
-    return FirstOf(StoredValue(tableM.Find(name)));
+    return FirstOf(StoredValue(tableM.Find(name != nullptr ? name : "")));
 }
 
 ref<DictValue> Dictionary::Get(const RoxString& name) const {
     return Find(name);
 }
 
-void Dictionary::GetRange(const RoxString& name, RoxArray<DictValue>& values) const {
+bool Dictionary::GetRange(const RoxString& name, RoxArray<DictValue>& values) const {
     DictionaryEntries::Name found;
-    if (!DictionaryEntries::Find(*this, {name.GetRepN(), nullptr}, found)) return;
+    if (!DictionaryEntries::Find(*this, {name.GetRepN(), nullptr}, found)) return true;
     const unsigned nValues = found.CountValues();
-    for (unsigned i = 0; i < nValues; ++i) values.Add(found.At(i));
+    for (unsigned i = 0; i < nValues; ++i) {
+        if (!values.Add(found.At(i))) return false;
+    }
+    return true;
 }
 
 RoxString Dictionary::GetString(const RoxString& name) const {
@@ -121,14 +124,15 @@ RoxString Dictionary::GetString(const RoxString& name) const {
                             : static_cast<StringValue*>(value)->GetValue();
 }
 
-void Dictionary::GetStringRange(const RoxString& name, RoxStringArray& texts) const {
+bool Dictionary::GetStringRange(const RoxString& name, RoxStringArray& texts) const {
     DictionaryEntries::Name found;
-    if (!DictionaryEntries::Find(*this, {name.GetRepN(), nullptr}, found)) return;
+    if (!DictionaryEntries::Find(*this, {name.GetRepN(), nullptr}, found)) return true;
     const unsigned nValues = found.CountValues();
     for (unsigned i = 0; i < nValues; ++i) {
         DictValue* const value = IfTagged(found.At(i), dictvalue::STRING);
-        if (value != nullptr) texts.Add(static_cast<StringValue*>(value)->GetValue());
+        if (value != nullptr && !texts.Add(static_cast<StringValue*>(value)->GetValue())) return false;
     }
+    return true;
 }
 
 ref<ArrayValue> Dictionary::GetArray(const RoxString& name) const {

@@ -22,7 +22,8 @@ class StringValue;
 
 /// Names to values. A name may have several values: adding to a name that is there appends, up to 65,535
 /// values, the runtime's limit for containers; the operations that add give false, and change nothing, beyond
-/// it. The order of the names is not defined; those who print sort them.
+/// it. The order of the names is not defined; those who print sort them. A dictionary must not come to hold
+/// itself, at any depth: walks over it would not end, and it would never be destroyed.
 class Dictionary final : public DictValue {
  public:
     static const char classTagG;
@@ -47,12 +48,14 @@ class Dictionary final : public DictValue {
 
     /// The name's first value, or a null reference.
     ref<DictValue> Get(const RoxString& name) const;
-    /// Appends all the name's values, in the order of their addition.
-    void GetRange(const RoxString& name, RoxArray<DictValue>& values) const;
+    /// Appends all the name's values, in the order of their addition. False when the array becomes full: it
+    /// lacks the last ones then.
+    bool GetRange(const RoxString& name, RoxArray<DictValue>& values) const;
     /// The text of the first value when that is a string, else an empty one in the dictionary's pool.
     RoxString GetString(const RoxString& name) const;
-    /// Appends the texts of those of the name's values that are strings.
-    void GetStringRange(const RoxString& name, RoxStringArray& texts) const;
+    /// Appends the texts of those of the name's values that are strings. False when the array becomes full,
+    /// as above.
+    bool GetStringRange(const RoxString& name, RoxStringArray& texts) const;
     /// The first value when it is an array or a dictionary, else a null reference.
     ref<ArrayValue> GetArray(const RoxString& name) const;
     ref<Dictionary> GetDictionary(const RoxString& name) const;
@@ -85,7 +88,8 @@ class Dictionary final : public DictValue {
     /// Reads the value of a key and adds it.
     bool ReadFieldValue(InputPointer& cursor, const RoxString& key, RoxString& error);
 
-    /// The name's first value without taking a reference, or null. The second form makes no string.
+    /// The name's first value without taking a reference, or null; it holds until the name is removed or the
+    /// dictionary destroyed. The second form makes no string and takes a null for the empty name.
     DictValue* Find(const RoxString& name) const;
     DictValue* Find(const char* name) const;
 

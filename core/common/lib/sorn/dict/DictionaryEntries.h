@@ -8,7 +8,8 @@
 namespace sorn {
 
 /// The walk over a dictionary's names and their values for writers and comparers, in table order: no
-/// references are taken, nothing is allocated. It holds until the dictionary changes.
+/// references are taken, and nothing is allocated but what PushSorted makes the caller's stack grow by. It
+/// holds until the dictionary changes.
 class DictionaryEntries {
  public:
     /// One name with its values; holds as long as the walk.

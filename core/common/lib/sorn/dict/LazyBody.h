@@ -4,14 +4,16 @@
 #include "sorn/model/OrvoVersion.h"
 
 class RoxMempool;
-class RoxString;
+
+namespace rox {
+class ByteBuffer;
+}
 
 /// The one knot between layers: dynamic values hold lazy bodies, and lazy bodies convert to dynamic values.
 /// This header names LazyDict for the layers below it and declares what they ask of it; the lazy layer
 /// defines it.
 namespace sorn {
 
-class ByteBuffer;
 class Dict;
 class Dictionary;
 class LazyDict;
@@ -24,7 +26,7 @@ ref<LazyDict> NewEmptyLazyBody(RoxMempool* pool);
 ref<Dict> DictOfLazyBody(RoxMempool* pool, const ref<LazyDict>& body);
 /// LazyDict::operator==; null equals only null.
 bool FEqualLazyBodies(const ref<LazyDict>& a, const ref<LazyDict>& b);
-/// LazyDict::ToJsonByteBuffer; a null reference writes "null".
-void WriteLazyBody(const ref<LazyDict>& body, ByteBuffer& out, bool pretty);
+/// LazyDict::ToWrite; the body is not null.
+ref<Dictionary> LazyBodyToWrite(const ref<LazyDict>& body, bool pretty, ref<rox::ByteBuffer>& text);
 
 }  // namespace sorn

@@ -3,8 +3,8 @@
 #include "sorn/dict/ArrayValue.h"
 #include "sorn/dict/DictValue.h"
 
-/// How Dict sees what stands under a name: an array as its elements, anything else as one value, null as
-/// none.
+/// How Dict sees what stands under a name: an array as its elements, anything else as one value, a null
+/// reference as none.
 namespace sorn::namedvalue {
 
 /// The numbers that Dict::GetType gives.

@@ -1,5 +1,6 @@
 #include "sorn/dict/Rox1ByteBufferCore.h"
 
+#include <algorithm>
 #include <cstring>
 
 #include "rox/RoxAssert.h"
@@ -19,7 +20,10 @@ uint32_t CheckedLength(uint64_t length) {
 
 void Rox1ByteBufferCore::AppendByte(unsigned char b) {
     const uint32_t length = GetLength();
-    if (length == GetCapacity()) bytesM.Realloc(CheckedLength(uint64_t{length} * 2));
+    if (length == GetCapacity()) {
+        CheckedLength(uint64_t{length} + 1);
+        bytesM.Realloc(static_cast<uint32_t>(std::min<uint64_t>(uint64_t{length} * 2, UINT32_MAX)));
+    }
     bytesM.GetData()[length] = b;
     bytesM.SetLength(length + 1);
 }

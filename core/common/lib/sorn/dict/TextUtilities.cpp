@@ -41,8 +41,7 @@ unsigned char LowByteOfToken(const char* p, const char* end) {
     return static_cast<unsigned char>(fNegative ? 0 - magnitude : magnitude);
 }
 
-/// Appends the bytes of a text in hexadecimal digits. A NUL ends it, and a vertical tab or a form feed
-/// separates as well.
+/// Appends the bytes of a text in hexadecimal digits.
 void ParseRange(const char* p, const char* end, ByteBuffer& out) {
     while (p != end && *p != '\0') {
         if (FSpace(static_cast<unsigned char>(*p))) {

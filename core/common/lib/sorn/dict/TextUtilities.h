@@ -7,13 +7,15 @@
 
 namespace sorn {
 
-/// Reads groups of hexadecimal digits between white space: each gives the low byte of its number, as strtol
-/// reads it in base 16, and 0 when it is none. Nothing is an error. The reverse of FormatBytes. The results
-/// are made in the pool.
+/// Reads groups of hexadecimal digits between white space, vertical tab and form feed included, up to a NUL
+/// or the end: each gives the low byte of its number, as a strtol of 64 bits reads it in base 16, and 0 when
+/// it is none. So a number out of range gives 0xFF, and 0x00 below zero. Nothing is an error. The reverse of
+/// FormatBytes. The results are made in the pool.
 RoxString ParseBytes(RoxMempool* pool, const RoxString& text);
 ref<rox::ByteBuffer> ParseBytesToBytestring(RoxMempool* pool, const RoxString& text);
 
 /// Each byte as two capital hexadecimal digits and a blank, the last one too. A null buffer counts as empty.
+/// At most 1,431,655,765 bytes, RoxAssertFail beyond.
 RoxString FormatBytes(RoxMempool* pool, const RoxString& bytes);
 RoxString FormatBytesFromBytestring(RoxMempool* pool, const ref<rox::ByteBuffer>& bytes);
 

@@ -8,7 +8,8 @@ class Dictionary;
 class DictValue;
 
 /// The engine of DictValue::Equals: a equals b, a null only null. Without recursion, in time linear in the
-/// smaller of the two.
+/// number of values met, shared ones as often as they are met, and in the texts of the lazy bodies met, which
+/// compare by these as a whole.
 bool FEqualValues(const DictValue* a, const DictValue* b);
 
 /// The engine of Dict::Equals(const ref<Dict>&), without recursion too. Bodies that must be converted for it

@@ -104,6 +104,7 @@ bool DictionaryParser::ReadElementValue(ArrayValue& array) {
 /// Reads from behind the opening bracket of the container to behind its closing one.
 bool DictionaryParser::Run(DictValue* container, bool isDictionary) {
     stackM.Push({container, nullptr, isDictionary, false});
+    keyCacheM.Open(pEndM > pM ? static_cast<size_t>(pEndM - pM) : 0);
     bool fBehindValue = false;
     while (!stackM.FEmpty()) {
         const Step step = stackM.Top().isDictionary ? ReadMembers(fBehindValue) : ReadElements(fBehindValue);

@@ -27,8 +27,7 @@ class DictionaryParser {
           errorM(error),
           pM(cursor.pCurrentM),
           pEndM(cursor.pEndM),
-          stackM(pool),
-          keyCacheM(pEndM > pM ? static_cast<size_t>(pEndM - pM) : 0) {}
+          stackM(pool) {}
 
     bool ReadObject(Dictionary& object);
     bool ReadArray(ArrayValue& array);

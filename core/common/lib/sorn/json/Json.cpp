@@ -12,7 +12,7 @@ void Json::StringToJson(const RoxString& text, bool onlyIfNeeded, ByteBuffer& ou
 }
 
 void Json::StringToJson(const RoxString& text, bool onlyIfNeeded, kelbaselib::Bytesink& out) {
-    JsonSinkOutput output(out, nullptr);
+    JsonSinkOutput output(out);
     stringwriter::WriteText(text, !onlyIfNeeded, output);
 }
 

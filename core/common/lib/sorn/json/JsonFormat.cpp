@@ -20,7 +20,7 @@ void JsonFormat::NewLine(ByteBuffer& out) const {
 }
 
 void JsonFormat::NewLine(kelbaselib::Bytesink& out) const {
-    JsonSinkOutput output(out, nullptr);
+    JsonSinkOutput output(out);
     NewLine(output);
 }
 
@@ -30,7 +30,7 @@ void JsonFormat::Indent(ByteBuffer& out) const {
 }
 
 void JsonFormat::Indent(kelbaselib::Bytesink& out) const {
-    JsonSinkOutput output(out, nullptr);
+    JsonSinkOutput output(out);
     Indent(output);
 }
 

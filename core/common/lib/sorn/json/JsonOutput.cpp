@@ -6,7 +6,6 @@
 #include "kelbaselib/Bytesink.h"
 #include "rox/RoxAssert.h"
 #include "sorn/dict/ByteBuffer.h"
-#include "sorn/dict/LazyBody.h"
 
 namespace sorn {
 
@@ -52,11 +51,6 @@ void JsonBufferOutput::NextWindow(unsigned n) {
     pEndM = pBeginM + window;
 }
 
-void JsonBufferOutput::LazyBody(const ref<LazyDict>& body, bool pretty) {
-    Close();
-    WriteLazyBody(body, bufferM, pretty);
-}
-
 JsonTextOutput::JsonTextOutput(RoxMempool* pool) : pMempoolM(pool) {
     pBeginM = pNextM = firstM;
     pEndM = firstM + sizeof firstM;
@@ -89,32 +83,20 @@ RoxString JsonTextOutput::Take() {
     return RoxString::AdoptRepN(text);
 }
 
-void JsonTextOutput::LazyBody(const ref<LazyDict>& body, bool pretty) {
-    ByteBuffer text(pMempoolM);
-    WriteLazyBody(body, text, pretty);
-    Bytes(text.GetData(), text.GetLength());
-}
-
-JsonSinkOutput::JsonSinkOutput(kelbaselib::Bytesink& sink, RoxMempool* pool) : sinkM(sink), pMempoolM(pool) {
+JsonSinkOutput::JsonSinkOutput(kelbaselib::Bytesink& sink) : sinkM(sink) {
     pBeginM = pNextM = windowM;
     pEndM = windowM + windowG;
 }
 
 void JsonSinkOutput::Flush() {
-    if (pNextM != pBeginM) sinkM.Write(windowM, static_cast<unsigned>(pNextM - pBeginM));
+    const unsigned n = static_cast<unsigned>(pNextM - pBeginM);
+    if (n != 0 && !isFullM) isFullM = sinkM.Write(windowM, n) != n;
     pNextM = pBeginM;
 }
 
 void JsonSinkOutput::NextWindow(unsigned) {
     static_assert(windowG >= maxRoomG);
     Flush();
-}
-
-void JsonSinkOutput::LazyBody(const ref<LazyDict>& body, bool pretty) {
-    ByteBuffer text(pMempoolM);
-    WriteLazyBody(body, text, pretty);
-    Flush();
-    if (text.GetLength() > 0) sinkM.Write(text.GetData(), text.GetLength());
 }
 
 }  // namespace sorn

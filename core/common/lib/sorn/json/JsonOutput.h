@@ -4,8 +4,6 @@
 #include <cstring>
 
 #include "rox/RoxString.h"
-#include "rox/ref.h"
-#include "sorn/dict/LazyBody.h"
 
 namespace kelbaselib {
 class Bytesink;
@@ -47,9 +45,6 @@ class JsonOutput {
     }
     void Blanks(size_t n);
 
-    /// The text of a deferred body; null writes "null".
-    virtual void LazyBody(const ref<LazyDict>& body, bool pretty) = 0;
-
  protected:
     JsonOutput() = default;
     ~JsonOutput() = default;
@@ -66,7 +61,6 @@ class JsonBufferOutput final : public JsonOutput {
  public:
     explicit JsonBufferOutput(ByteBuffer& buffer) : bufferM(buffer) {}
     ~JsonBufferOutput() { Close(); }
-    void LazyBody(const ref<LazyDict>& body, bool pretty) override;
 
  private:
     void NextWindow(unsigned n) override;
@@ -80,7 +74,6 @@ class JsonTextOutput final : public JsonOutput {
  public:
     explicit JsonTextOutput(RoxMempool* pool);
     ~JsonTextOutput();
-    void LazyBody(const ref<LazyDict>& body, bool pretty) override;
 
     /// What was written, in the pool. Ends the writing.
     RoxString Take();
@@ -93,22 +86,21 @@ class JsonTextOutput final : public JsonOutput {
     unsigned char firstM[4096];
 };
 
-/// Writes to a sink in pieces of a fixed size. The last piece goes out when this object is gone.
+/// Writes to a sink in pieces of a fixed size. The last piece goes out when this object is gone. Once the
+/// sink takes less than a whole piece, it gets nothing more.
 class JsonSinkOutput final : public JsonOutput {
  public:
     static constexpr unsigned windowG = 4096;
 
-    /// `pool` is for the texts of deferred bodies.
-    JsonSinkOutput(kelbaselib::Bytesink& sink, RoxMempool* pool);
+    explicit JsonSinkOutput(kelbaselib::Bytesink& sink);
     ~JsonSinkOutput() { Flush(); }
-    void LazyBody(const ref<LazyDict>& body, bool pretty) override;
 
  private:
     void NextWindow(unsigned n) override;
     void Flush();
 
     kelbaselib::Bytesink& sinkM;
-    RoxMempool* pMempoolM;
+    bool isFullM = false;
     unsigned char windowM[windowG];
 };
 

@@ -13,8 +13,9 @@ namespace sorn {
 /// references: the keys in it belong to the tree that the parse builds, which only grows meanwhile.
 class KeyCache {
  public:
-    /// For a parse of nInput bytes: a short text does not pay for many places.
-    explicit KeyCache(size_t nInput) {
+    /// Opens the cache, which must come before all else, for a parse of nInput bytes: a short text does not
+    /// pay for many places, and one without keys for none.
+    void Open(size_t nInput) {
         while (nBitsM < maxBitsG && nInput >> (nBitsM + 4) != 0) ++nBitsM;
         std::memset(vKeyM, 0, sizeof vKeyM[0] << nBitsM);
     }

@@ -111,13 +111,6 @@ unsigned char* WritePiece(Bytes begin, Bytes pieceEnd, Bytes end, unsigned char*
     return out;
 }
 
-/// How many bytes from p on may stand without quotes, at most n.
-size_t CountBare(Bytes p, size_t n) {
-    size_t i = 0;
-    while (i < n && byteclass::FIs(p[i], byteclass::BARE)) ++i;
-    return i;
-}
-
 /// Copies n bytes; most numbers and words are too short for a call.
 unsigned char* CopyShort(Bytes p, size_t n, unsigned char* out) {
     if (n > 8) {
@@ -161,7 +154,7 @@ void WriteText(const RoxString& text, bool fQuote, JsonOutput& out) {
         return;
     }
     const Bytes begin = reinterpret_cast<Bytes>(text.Utf8());
-    const size_t nBare = CountBare(begin, n);
+    const size_t nBare = static_cast<size_t>(textscan::FindBareEnd(begin, begin + n) - begin);
     if (nBare == n) {
         if (n > JsonOutput::maxRoomG) {
             out.Bytes(begin, n);

@@ -19,7 +19,7 @@ void WriteValue(const DictValue& value, ByteBuffer& out, JsonFormat format) {
 }
 
 void WriteValue(const DictValue& value, kelbaselib::Bytesink& out, JsonFormat format) {
-    JsonSinkOutput output(out, value.GetMempool());
+    JsonSinkOutput output(out);
     ValueWriter(value.GetMempool(), output, format).Write(value);
 }
 

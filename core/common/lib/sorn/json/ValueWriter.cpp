@@ -3,23 +3,13 @@
 #include "rox/VkCast.h"
 #include "sorn/dict/ArrayValue.h"
 #include "sorn/dict/LazyDictValue.h"
+#include "sorn/dict/RoxByteBuffer.h"
 #include "sorn/dict/StringValue.h"
 #include "sorn/json/StringWriter.h"
 
 namespace sorn {
 
 namespace {
-
-void WriteNullOrLazy(const DictValue& value, JsonOutput& out, bool pretty) {
-    // The two classes share their tag.
-    const LazyDictValue* const lazy = VkCast<LazyDictValue>(const_cast<DictValue*>(&value));
-    if (lazy == nullptr) {
-        out.Literal("null");
-    } else {
-        // Only the flag goes on: the body begins again at indentation 0.
-        out.LazyBody(lazy->GetValue(), pretty);
-    }
-}
 
 /// Asks for what the writing of a value reads first behind the value itself: it lies anywhere, and is wanted
 /// soon.
@@ -67,22 +57,50 @@ bool ValueWriter::Begin(const DictValue& value) {
             BeginDictionary(static_cast<const Dictionary&>(value));
             return false;
         default:
-            WriteNullOrLazy(value, outM, formatM.isPretty);
-            return true;
+            return BeginNullOrLazy(value);
     }
+}
+
+bool ValueWriter::BeginNullOrLazy(const DictValue& value) {
+    // The two classes share their tag.
+    const LazyDictValue* const lazy = VkCast<LazyDictValue>(const_cast<DictValue*>(&value));
+    if (lazy == nullptr || lazy->GetValue() == nullptr) {
+        outM.Literal("null");
+        return true;
+    }
+    ref<rox::ByteBuffer> text;
+    const ref<Dictionary> dictionary = LazyBodyToWrite(lazy->GetValue(), formatM.isPretty, text);
+    if (dictionary == nullptr) {
+        if (text != nullptr) outM.Bytes(text->GetData(), text->GetLength());
+        return true;
+    }
+    dictionary->UpRef();
+    bodiesM.Push({dictionary.get(), formatM.indentLevel});
+    formatM.indentLevel = 0;
+    BeginDictionary(*dictionary);
+    framesM.Top().isBody = true;
+    return false;
+}
+
+/// Leaves the dictionary of a lazy body.
+void ValueWriter::EndBody() {
+    const Body body = bodiesM.Top();
+    bodiesM.Pop();
+    formatM.indentLevel = body.outerLevel;
+    RoxCore::DownRef(body.held);
 }
 
 void ValueWriter::BeginArray(const ArrayValue& array) {
     outM.Byte('[');
     NewLine();
     ++formatM.indentLevel;
-    framesM.Push({&array, 0, 0, array.CountValues(), false, 0});
+    framesM.Push({&array, 0, 0, array.CountValues(), false, false, 0});
 }
 
 void ValueWriter::BeginDictionary(const Dictionary& dictionary) {
     outM.Byte('{');
     ++formatM.indentLevel;
-    framesM.Push({nullptr, 0, 0, DictionaryEntries::Count(dictionary), false, namesM.Size()});
+    framesM.Push({nullptr, 0, 0, DictionaryEntries::Count(dictionary), false, false, namesM.Size()});
     DictionaryEntries::PushSorted(dictionary, namesM);
 }
 
@@ -143,6 +161,7 @@ void ValueWriter::End(char bracket) {
     --formatM.indentLevel;
     Indent();
     outM.Byte(bracket);
+    if (framesM.Top().isBody) EndBody();
     framesM.Pop();
 }
 

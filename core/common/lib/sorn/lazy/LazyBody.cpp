@@ -1,8 +1,8 @@
 #include "sorn/dict/LazyBody.h"
 
-#include "sorn/dict/ByteBuffer.h"
 #include "sorn/dict/Dict.h"
 #include "sorn/dict/Dictionary.h"
+#include "sorn/dict/RoxByteBuffer.h"
 #include "sorn/lazy/LazyDict.h"
 
 namespace sorn {
@@ -24,12 +24,8 @@ bool FEqualLazyBodies(const ref<LazyDict>& a, const ref<LazyDict>& b) {
     return *a == *b;
 }
 
-void WriteLazyBody(const ref<LazyDict>& body, ByteBuffer& out, bool pretty) {
-    if (body == nullptr) {
-        out.AppendLiteral("null");
-    } else {
-        body->ToJsonByteBuffer(out, pretty);
-    }
+ref<Dictionary> LazyBodyToWrite(const ref<LazyDict>& body, bool pretty, ref<rox::ByteBuffer>& text) {
+    return body->ToWrite(pretty, text);
 }
 
 }  // namespace sorn

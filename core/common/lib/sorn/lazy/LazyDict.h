@@ -19,8 +19,8 @@ class Dict;
 class Dictionary;
 class SornObject;
 
-/// A message body in the shape in which it came, shared by reference. Which member holds it is told by `rep`;
-/// nothing is cached: every conversion works anew. All results are made in the pool that the body was
+/// A message body in the shape in which it came, shared by reference. Which member holds it is told by
+/// GetRep; nothing is cached: every conversion works anew. All results are made in the pool that the body was
 /// allocated in.
 class LazyDict final : public RoxCore {
  public:
@@ -69,11 +69,15 @@ class LazyDict final : public RoxCore {
     /// The body as a dictionary, or null and words, which replace what `error` holds. The one of a REP_DICT
     /// or REP_DICTIONARY body is shared, not copied.
     ref<Dictionary> ToDictionary(RoxString& error) const;
+    /// What the body's JSON text is made of, for writers that walk dictionaries without recursion: a
+    /// dictionary, or null and the text itself in `text`, or, of an unreadable body, null and a null
+    /// reference.
+    ref<Dictionary> ToWrite(bool pretty, ref<rox::ByteBuffer>& text) const;
     /// Appends the body's JSON text. JSON bytes go out as they are unless `pretty`; an unreadable body writes
     /// nothing.
     void ToJsonByteBuffer(ByteBuffer& out, bool pretty) const;
     /// Equal contents, whatever the representations: both sides through ToDict, compared as Dict::operator==
-    /// does.
+    /// does, by their compact texts; so without recursion, however deep bodies lie in bodies.
     bool operator==(const LazyDict& other) const;
     bool operator!=(const LazyDict& other) const { return !(*this == other); }
 

@@ -13,6 +13,7 @@ namespace sorn {
 
 // A body whose member was never given is answered as an unreadable one without words.
 ref<Dictionary> LazyDict::ToDictionary(RoxString& error) const {
+    error = RoxString();
     switch (repM) {
         case REP_DICT:
             return dictM != nullptr ? dictM->GetDictionary() : nullptr;
@@ -49,14 +50,24 @@ ref<Dict> LazyDict::ToDict() const {
     return MempoolNew<Dict>(GetMempool(), dictionary);
 }
 
-void LazyDict::ToJsonByteBuffer(ByteBuffer& out, bool pretty) const {
-    if (repM == REP_JSON && bytesM != nullptr && !pretty) {
-        out.AppendBytes(bytesM->GetData(), bytesM->GetLength());
-        return;
+ref<Dictionary> LazyDict::ToWrite(bool pretty, ref<rox::ByteBuffer>& text) const {
+    text = nullptr;
+    if (repM == REP_JSON && !pretty) {
+        text = bytesM;
+        return nullptr;
     }
     RoxString error;  // goes nowhere
-    ref<Dictionary> dictionary = ToDictionary(error);
-    if (dictionary != nullptr) dictionary->ToJson(out, JsonFormat(pretty));
+    return ToDictionary(error);
+}
+
+void LazyDict::ToJsonByteBuffer(ByteBuffer& out, bool pretty) const {
+    ref<rox::ByteBuffer> text;
+    const ref<Dictionary> dictionary = ToWrite(pretty, text);
+    if (dictionary != nullptr) {
+        dictionary->ToJson(out, JsonFormat(pretty));
+    } else if (text != nullptr) {
+        out.AppendBytes(text->GetData(), text->GetLength());
+    }
 }
 
 bool LazyDict::operator==(const LazyDict& other) const {
