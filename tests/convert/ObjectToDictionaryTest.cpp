@@ -331,21 +331,19 @@ TEST_F(ObjectToDictionaryTest, IdConversionsByThemselves) {
     unsigned long long longId = 77;
     RoxString stringId("before");
     RoxString error("old;");
-    EXPECT_TRUE(DictionarySornObject::StringToIntId(&pool, field, RoxString("vuka:etc.12"), error, intId));
+    EXPECT_TRUE(Context().StringToIntId(&pool, field, RoxString("vuka:etc.12"), error, intId));
     EXPECT_EQ(intId, 12u);
-    EXPECT_TRUE(
-        DictionarySornObject::StringToLongId(&pool, field, RoxString("vuka:etc.vod.1"), error, longId));
+    EXPECT_TRUE(Context().StringToLongId(&pool, field, RoxString("vuka:etc.vod.1"), error, longId));
     EXPECT_EQ(longId, (16384ull << 48) + 1);
-    EXPECT_TRUE(
-        DictionarySornObject::StringToStringId(&pool, field, RoxString("vuka:etc.vod.1"), error, stringId));
+    EXPECT_TRUE(Context().StringToStringId(&pool, field, RoxString("vuka:etc.vod.1"), error, stringId));
     EXPECT_EQ(Text(stringId), "vod.1");
     EXPECT_EQ(Text(error), "old;");
-    EXPECT_FALSE(DictionarySornObject::StringToIntId(&pool, field, RoxString("vuka:et.12"), error, intId));
+    EXPECT_FALSE(Context().StringToIntId(&pool, field, RoxString("vuka:et.12"), error, intId));
     EXPECT_EQ(Text(error), "old;wrong prefix on idbad prefix: vuka:et.12");
     error = "";
-    EXPECT_FALSE(DictionarySornObject::StringToLongId(&pool, none, RoxString("12"), error, longId));
+    EXPECT_FALSE(Context().StringToLongId(&pool, none, RoxString("12"), error, longId));
     EXPECT_EQ(Text(error), "no struct for idbad prefix: 12");
-    EXPECT_FALSE(DictionarySornObject::StringToStringId(&pool, none, RoxString("12"), error, stringId));
+    EXPECT_FALSE(Context().StringToStringId(&pool, none, RoxString("12"), error, stringId));
     EXPECT_EQ(Text(error), "no struct for idbad prefix: 12no struct for idbad prefix: 12");
     EXPECT_EQ(intId, 12u);
     EXPECT_EQ(Text(stringId), "vod.1");

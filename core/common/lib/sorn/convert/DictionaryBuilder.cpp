@@ -8,7 +8,8 @@
 namespace sorn {
 
 ref<Dictionary> DictionaryBuilder::Build(const SornObject& object) {
-    ref<Dictionary> dictionary = OpenObject(object);
+    ref<Dictionary> dictionary = NewDictionary(object);
+    PushObject(object, dictionary.get());
     Run();
     return dictionary;
 }
@@ -63,46 +64,51 @@ void DictionaryBuilder::AddElement(Frame& frame) {
     FieldSource source(frame.pObject->MemberAt(field), frame.isMulti);
     unsigned i = frame.nextElement++;
     if (!FHoldsObjects(field.Type())) {
-        Place(frame, MakeValue(field, source, i));
+        ref<DictValue> value = MakeValue(field, source, i);
+        if (value != nullptr && !Place(frame, value)) frame.nextElement = frame.nElements;
         return;
     }
     const SornObject* inner = source.ReferenceAt<SornObject>(i);
     if (inner == nullptr) return;
-    size_t level = stackM.Size() - 1;
-    ref<Dictionary> dictionary = OpenObject(*inner);
-    Place(stackM[level], dictionary);  // `frame` may have moved
+    ref<Dictionary> dictionary = NewDictionary(*inner);
+    if (Place(frame, dictionary)) {
+        PushObject(*inner, dictionary.get());  // `frame` may move
+    } else {
+        frame.nextElement = frame.nElements;
+    }
 }
 
-ref<Dictionary> DictionaryBuilder::OpenObject(const SornObject& object) {
+ref<Dictionary> DictionaryBuilder::NewDictionary(const SornObject& object) const {
+    return Dictionary::New(pMempoolM, *InternedString(nullptr, StructOf(object).name));
+}
+
+void DictionaryBuilder::PushObject(const SornObject& object, Dictionary* out) {
     Frame frame{};
     frame.pInfo = &StructOf(object);
     frame.pObject = &object;
-    ref<Dictionary> dictionary = Dictionary::New(pMempoolM, *InternedString(nullptr, frame.pInfo->name));
-    frame.pDictionary = dictionary.get();
+    frame.pDictionary = out;
     stackM.Push(frame);
-    return dictionary;
 }
 
-void DictionaryBuilder::Place(Frame& frame, const ref<DictValue>& value) const {
-    if (value == nullptr) return;
+/// False when the name is full: then nothing holds the value, and the field has no more to add.
+bool DictionaryBuilder::Place(Frame& frame, const ref<DictValue>& value) const {
     // Lazy elements are values of the name one by one, and not an array. Of such values the way back takes
     // the first.
     if (!frame.isMulti || frame.pField->Type() == SORN_DATA_TYPE_KNOWN_DICT_AS_LAZY) {
-        frame.pDictionary->Add(*frame.pName, value);
-        return;
+        return frame.pDictionary->Add(*frame.pName, value);
     }
     if (frame.pArray == nullptr) {
         ref<ArrayValue> array(new (pMempoolM) ArrayValue(pMempoolM));
-        frame.pDictionary->Add(*frame.pName, array);
+        if (!frame.pDictionary->Add(*frame.pName, array)) return false;
         frame.pArray = array.get();
     }
-    frame.pArray->Add(value);
+    return frame.pArray->Add(value);
 }
 
 const StructInfo& DictionaryBuilder::StructOf(const SornObject& object) const {
-    uint32_t id = object.structId;
-    RoxAssert(id < nStructDefM && vStructDefM[id] != nullptr, "the object is of a struct of the schema");
-    return *vStructDefM[id];
+    const StructInfo* info = tableM.Find(object.structId);
+    RoxAssert(info != nullptr, "the object is of a struct of the schema");
+    return *info;
 }
 
 }  // namespace sorn

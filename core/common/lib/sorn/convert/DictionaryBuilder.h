@@ -4,6 +4,7 @@
 #include "rox/RoxWorkStack.h"
 #include "rox/ref.h"
 #include "sorn/convert/FieldAccess.h"
+#include "sorn/convert/StructTable.h"
 #include "sorn/model/OrvoVersion.h"
 #include "sorn/model/SornObject.h"
 #include "sorn/model/StructInfo.h"
@@ -18,17 +19,13 @@ class DictValue;
 /// one conversion. Null references are left out, at every place where one can stand.
 class DictionaryBuilder {
  public:
-    DictionaryBuilder(RoxMempool* pool, const StructInfo* const* vStructDef, uint32_t nStructDef,
-                      OrvoVersion version)
-        : pMempoolM(pool),
-          vStructDefM(vStructDef),
-          nStructDefM(nStructDef),
-          versionM(version),
-          stackM(pool) {}
+    DictionaryBuilder(RoxMempool* pool, StructTable table, OrvoVersion version)
+        : pMempoolM(pool), tableM(table), versionM(version), stackM(pool) {}
 
     /// The whole dictionary.
     ref<Dictionary> Build(const SornObject& object);
-    /// Adds one field, repeated or not, to a dictionary that is there.
+    /// Adds one field, repeated or not, to a dictionary that is there. A name that has 65,535 values, the
+    /// most that it takes, is left as it is.
     void AddField(const RoxString& name, const FieldInfo* field, bool isMulti, const SornObject& object,
                   Dictionary* out);
 
@@ -52,16 +49,16 @@ class DictionaryBuilder {
     bool NextField(Frame& frame) const;
     void StartField(Frame& frame, const FieldInfo* field, const RoxString* name, bool isMulti) const;
     void AddElement(Frame& frame);
-    ref<Dictionary> OpenObject(const SornObject& object);
-    void Place(Frame& frame, const ref<DictValue>& value) const;
+    ref<Dictionary> NewDictionary(const SornObject& object) const;
+    void PushObject(const SornObject& object, Dictionary* out);
+    bool Place(Frame& frame, const ref<DictValue>& value) const;
     ref<DictValue> MakeValue(const FieldInfo& field, const FieldSource& source, unsigned i) const;
     ref<DictValue> MakeReferenceValue(const FieldInfo& field, const FieldSource& source, unsigned i) const;
     RoxString MakeText(const FieldInfo& field, const FieldSource& source, unsigned i) const;
     const StructInfo& StructOf(const SornObject& object) const;
 
     RoxMempool* pMempoolM;
-    const StructInfo* const* vStructDefM;
-    uint32_t nStructDefM;
+    StructTable tableM;
     OrvoVersion versionM;
     RoxWorkStack<Frame, 8> stackM;
 };

@@ -62,11 +62,11 @@ RoxString DictionaryBuilder::MakeText(const FieldInfo& field, const FieldSource&
         case SORN_DATA_TYPE_ENUM:
             return schematext::EnumName(pMempoolM, field, source.PlainAt<uint32_t>(i));
         case SORN_DATA_TYPE_INT_ID:
-            return schematext::LongIdText(pMempoolM, field, source.PlainAt<uint32_t>(i));
+            return schematext::LongIdText(pMempoolM, tableM, field, source.PlainAt<uint32_t>(i));
         case SORN_DATA_TYPE_LONG_ID:
-            return schematext::LongIdText(pMempoolM, field, source.PlainAt<uint64_t>(i));
+            return schematext::LongIdText(pMempoolM, tableM, field, source.PlainAt<uint64_t>(i));
         case SORN_DATA_TYPE_STRING_ID:
-            return schematext::StringIdText(pMempoolM, field, source.TextAt(i));
+            return schematext::StringIdText(pMempoolM, tableM, field, source.TextAt(i));
         default:
             return source.TextAt(i);
     }

@@ -1,5 +1,6 @@
 #include "sorn/convert/ObjectBuilder.h"
 
+#include "sorn/convert/SchemaText.h"
 #include "sorn/dict/ArrayValue.h"
 #include "sorn/dict/Dictionary.h"
 #include "sorn/model/InternedString.h"
@@ -15,8 +16,12 @@ constexpr const char* innerMultiWordsG = " Can't convert inner Dictionary to Sor
 
 }  // namespace
 
-ObjectBuilder::ObjectBuilder(RoxMempool* pool, OrvoVersion version, RoxString& error)
-    : pMempoolM(pool), versionM(version), wordsM(pool, error), readerM(pool, version, wordsM), stackM(pool) {}
+ObjectBuilder::ObjectBuilder(RoxMempool* pool, StructTable table, OrvoVersion version, RoxString& error)
+    : pMempoolM(pool),
+      versionM(version),
+      wordsM(pool, error),
+      readerM(pool, table, version, wordsM),
+      stackM(pool) {}
 
 ObjectBuilder::~ObjectBuilder() {
     while (!stackM.FEmpty()) PopFrame();
@@ -66,11 +71,11 @@ bool ObjectBuilder::NextField() {
     while (++frame.slot < frame.pInfo->nFields) {
         const FieldInfo* field = frame.pInfo->SelectFieldVariant(frame.slot, versionM);
         if (field == nullptr) continue;
-        const RoxString& name = *InternedString(nullptr, frame.pInfo->FieldName(*field));
+        const char* name = frame.pInfo->FieldName(*field);
         DictValue* value = frame.pDictionary->Find(name);
         if (value == nullptr) {
             if (field->arity != SORN_ARITY_REQUIRED || versionM.FAbsent()) continue;
-            return Fail("Required field not set: ", name.Utf8());
+            return Fail("Required field not set: ", name);
         }
         frame.pField = field;
         frame.isMulti = field->arity == SORN_ARITY_MULTI;
@@ -134,7 +139,8 @@ bool ObjectBuilder::OpenObject(Dictionary* dictionary) {
     RoxString type;
     if (dictionary != nullptr) type = dictionary->GetString(*InternedString(nullptr, "type"));
     if (type.FEmpty()) return Fail("Dictionary has no 'type' field.", "");
-    const StructInfo* info = StructInfoMap::LookupStructByName(type.Utf8());
+    const StructInfo* info =
+        schematext::FHasNul(type) ? nullptr : StructInfoMap::LookupStructByName(type.Utf8());
     if (info == nullptr) return Fail("no such structure type: ", type.Utf8());
 
     ref<SornObject> object = info->Factory(pMempoolM);

@@ -4,6 +4,7 @@
 #include "rox/RoxWorkStack.h"
 #include "rox/ref.h"
 #include "sorn/convert/ErrorWords.h"
+#include "sorn/convert/StructTable.h"
 #include "sorn/convert/ValueReader.h"
 #include "sorn/model/OrvoVersion.h"
 #include "sorn/model/SornObject.h"
@@ -18,8 +19,9 @@ class Dictionary;
 /// costs memory of the pool and none of the thread's stack. One builder makes one conversion.
 class ObjectBuilder {
  public:
-    /// `error` is the caller's string, which gets the words of a failure.
-    ObjectBuilder(RoxMempool* pool, OrvoVersion version, RoxString& error);
+    /// The table gives ids their prefixes; structs are found by name in the schema. `error` is the caller's
+    /// string, which gets the words of a failure.
+    ObjectBuilder(RoxMempool* pool, StructTable table, OrvoVersion version, RoxString& error);
     ~ObjectBuilder();
 
     /// The whole object, or null.

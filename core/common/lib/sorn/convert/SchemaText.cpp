@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <cstring>
 
+#include "sorn/convert/EnumNameIndex.h"
+#include "sorn/dict/Dict.h"
 #include "sorn/dict/ScalarFormat.h"
 #include "sorn/model/InternedString.h"
 #include "sorn/model/Schema.h"
@@ -15,8 +17,8 @@ const char* PrefixOf(const StructInfo& info) {
     return info.idPrefix != nullptr ? info.idPrefix : "";
 }
 
-RoxString IdText(RoxMempool* pool, const FieldInfo& field, const char* id, size_t nId) {
-    const StructInfo* info = Schema::FindStruct(field.typeRef);
+RoxString IdText(RoxMempool* pool, StructTable table, const FieldInfo& field, const char* id, size_t nId) {
+    const StructInfo* info = table.Find(field.typeRef);
     if (info == nullptr) return RoxString::FromUtf8Bytes(pool, 3, "XXX");
     char text[maxIdBytesG];
     const char* prefix = PrefixOf(*info);
@@ -29,6 +31,10 @@ RoxString IdText(RoxMempool* pool, const FieldInfo& field, const char* id, size_
 
 }  // namespace
 
+bool FHasNul(const RoxString& text) {
+    return strlen(text.Utf8()) != text.NByte();
+}
+
 RoxString EnumName(RoxMempool* pool, const FieldInfo& field, uint32_t value) {
     const EnumDef* def = Schema::FindEnum(field.typeRef);
     const char* name = def != nullptr ? def->NameOf(value) : nullptr;
@@ -38,31 +44,24 @@ RoxString EnumName(RoxMempool* pool, const FieldInfo& field, uint32_t value) {
 
 bool EnumValue(const FieldInfo& field, const RoxString& name, uint32_t& value, ErrorWords& words) {
     const EnumDef* def = Schema::FindEnum(field.typeRef);
-    const char* text = name.Utf8();
-    if (def != nullptr && strlen(text) == name.NByte()) {
-        for (uint32_t i = 0; i < def->count; ++i) {
-            const char* candidate = def->names[i];
-            if (candidate == nullptr || candidate[0] != text[0] || strcmp(candidate, text) != 0) continue;
-            value = i;
-            return true;
-        }
-    }
+    if (def != nullptr && !FHasNul(name) && EnumNameIndex::Find(*def, name.Utf8(), name.NByte(), value))
+        return true;
     words.Append("bad enum item name");
     return false;
 }
 
-RoxString LongIdText(RoxMempool* pool, const FieldInfo& field, uint64_t id) {
+RoxString LongIdText(RoxMempool* pool, StructTable table, const FieldInfo& field, uint64_t id) {
     char number[scalarformat::maxTextBytesG];
     const char* end = scalarformat::WriteLongId(id, number);
-    return IdText(pool, field, number, static_cast<size_t>(end - number));
+    return IdText(pool, table, field, number, static_cast<size_t>(end - number));
 }
 
-RoxString StringIdText(RoxMempool* pool, const FieldInfo& field, const RoxString& id) {
-    return IdText(pool, field, id.Utf8(), id.NByte());
+RoxString StringIdText(RoxMempool* pool, StructTable table, const FieldInfo& field, const RoxString& id) {
+    return IdText(pool, table, field, id.Utf8(), id.NByte());
 }
 
-const char* BareId(const FieldInfo& field, const RoxString& text, ErrorWords& words) {
-    const StructInfo* info = Schema::FindStruct(field.typeRef);
+const char* BareId(StructTable table, const FieldInfo& field, const RoxString& text, ErrorWords& words) {
+    const StructInfo* info = table.Find(field.typeRef);
     if (info != nullptr) {
         const char* prefix = PrefixOf(*info);
         size_t nPrefix = strlen(prefix);
@@ -73,6 +72,14 @@ const char* BareId(const FieldInfo& field, const RoxString& text, ErrorWords& wo
     words.Append("bad prefix: ");
     words.Append(text);
     return nullptr;
+}
+
+uint32_t BareInt(RoxMempool* pool, const RoxString& text, const char* bare) {
+    return FHasNul(text) ? 0 : Dict::ParseU32(pool, bare);
+}
+
+uint64_t BareLong(RoxMempool* pool, const RoxString& text, const char* bare) {
+    return FHasNul(text) ? 0 : Dict::ParseLongId(pool, bare);
 }
 
 RoxString BareString(RoxMempool* pool, const RoxString& text, const char* bare) {

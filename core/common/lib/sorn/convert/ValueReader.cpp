@@ -133,7 +133,7 @@ bool ValueReader::ReadEnum(const FieldInfo& field, DictValue* value, const Field
 bool ValueReader::ReadId(const FieldInfo& field, DictValue* value, const FieldTarget& target) {
     const StringValue* text = AsString(value);
     if (text == nullptr) return NotAccepted(mustBeStringG);
-    const char* bare = schematext::BareId(field, text->GetValue(), wordsM);
+    const char* bare = schematext::BareId(tableM, field, text->GetValue(), wordsM);
     if (bare == nullptr) {
         wordsM.Append(target.FMulti() ? badValueMultiG : badValueG);
         return false;
@@ -145,9 +145,9 @@ bool ValueReader::StoreId(const FieldInfo& field, const RoxString& text, const c
                           const FieldTarget& target) {
     switch (field.Type()) {
         case SORN_DATA_TYPE_INT_ID:
-            return target.StorePlain<uint32_t>(Dict::ParseU32(pMempoolM, bare));
+            return target.StorePlain(schematext::BareInt(pMempoolM, text, bare));
         case SORN_DATA_TYPE_LONG_ID:
-            return target.StorePlain<uint64_t>(Dict::ParseLongId(pMempoolM, bare));
+            return target.StorePlain(schematext::BareLong(pMempoolM, text, bare));
         default:
             return target.StoreText(schematext::BareString(pMempoolM, text, bare));
     }

@@ -2,6 +2,7 @@
 
 #include "sorn/convert/ErrorWords.h"
 #include "sorn/convert/FieldAccess.h"
+#include "sorn/convert/StructTable.h"
 #include "sorn/dict/DictValue.h"
 #include "sorn/model/FieldInfo.h"
 #include "sorn/model/OrvoVersion.h"
@@ -12,8 +13,8 @@ namespace sorn {
 /// the way from dictionaries to objects. Fields that hold objects are not its business.
 class ValueReader {
  public:
-    ValueReader(RoxMempool* pool, OrvoVersion version, ErrorWords& words)
-        : pMempoolM(pool), versionM(version), wordsM(words) {}
+    ValueReader(RoxMempool* pool, StructTable table, OrvoVersion version, ErrorWords& words)
+        : pMempoolM(pool), tableM(table), versionM(version), wordsM(words) {}
 
     /// False and words when the value does not fit, or when a repeated field is full. A null value fits
     /// nothing.
@@ -41,6 +42,7 @@ class ValueReader {
     bool NotAccepted(const char* text);
 
     RoxMempool* pMempoolM;
+    StructTable tableM;
     OrvoVersion versionM;
     ErrorWords& wordsM;
 };

@@ -7,8 +7,9 @@ class RoxMempool;
 namespace sorn {
 
 /// The one shared string of a name, out of the process's global string table. `text` must live as long as the
-/// table: a name of a struct, a field or an enumeration value, or a literal. Copy the value at once; the copy
-/// shares its representation, which lies on the general heap, and may outlive the table.
+/// table: a name of a struct, a field or an enumeration value, or a literal. Entries do not
+/// move, so the address holds until DestroyGlobalSornHashTable; a copy of the string shares its
+/// representation, which lies on the general heap, and may outlive the table.
 ///
 /// The first call makes the table, and the table keeps that caller's pool for what it needs later: that pool
 /// must outlive the table, so call DestroyGlobalSornHashTable before it dies. Null stands for the general
