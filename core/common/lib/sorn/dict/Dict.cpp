@@ -24,8 +24,10 @@ bool AddToDictOrArray(Dictionary& dictionary, RoxMempool* pool, const RoxString&
     if (old == nullptr) return dictionary.Add(name, value);
     if (old->GetTag() == dictvalue::ARRAY) return static_cast<ArrayValue*>(old.get())->Add(value);
     // The name and the value may lie in what is removed: under a name of several values all go.
+    // NOLINTBEGIN(performance-unnecessary-copy-initialization)
     const RoxString heldName = name;
     const T heldValue = value;
+    // NOLINTEND(performance-unnecessary-copy-initialization)
     const ref<ArrayValue> array(new (pool) ArrayValue(pool));
     dictionary.Remove(heldName);
     return dictionary.Add(heldName, array) && array->Add(old) && array->Add(heldValue);
@@ -195,7 +197,8 @@ void Dict::Remove(const RoxString& name, unsigned index) {
     const ref<DictValue> value = dictionaryM->Get(name);
     if (value != nullptr && value->GetTag() == dictvalue::ARRAY) {
         auto* const array = static_cast<ArrayValue*>(value.get());
-        const RoxString heldName = name;  // it may be the text of the element
+        // It may be the text of the element. NOLINTNEXTLINE(performance-unnecessary-copy-initialization)
+        const RoxString heldName = name;
         array->Remove(index);
         if (array->CountValues() == 0) dictionaryM->Remove(heldName);
         return;

@@ -103,6 +103,7 @@ RoxString ReplaceCharsWithString(RoxMempool* pool, const RoxString& text, const 
     return out.ToRoxString(pool);
 }
 
+// NOLINTNEXTLINE(performance-unnecessary-value-param): callers know that the text is a copy
 void SplitString(RoxString text, const RoxString& delimiter, RoxStringArray& pieces) {
     const uint32_t nDelimiter = delimiter.NByte();
     if (nDelimiter == 0) return;

@@ -66,7 +66,7 @@ bool DictionaryParser::ReadMemberValue(Dictionary& object, const RoxString& key)
         if (object.Add(key, container)) return Run(container.get(), isDictionary);
     } else {
         DictValue* value = nullptr;
-        const char* words = nullptr;
+        const char* words = "";
         const Bytes behind = ReadScalarAt(p, pEndM, pMempoolM, value, words);
         if (behind == nullptr) {
             Fail(p, {words, fieldWrapperG, key.View()});
@@ -88,7 +88,7 @@ bool DictionaryParser::ReadElementValue(ArrayValue& array) {
         if (array.Add(container)) return Run(container.get(), isDictionary);
     } else {
         DictValue* value = nullptr;
-        const char* words = nullptr;
+        const char* words = "";
         const Bytes behind = ReadScalarAt(p, pEndM, pMempoolM, value, words);
         if (behind == nullptr) {
             Fail(p, {words, scalarElementWrapperG});
@@ -146,6 +146,7 @@ DictionaryParser::Step DictionaryParser::ReadMembers(bool fBehindValue) {
 
 /// Reads elements of the array on top until it ends, or a container opens in it.
 DictionaryParser::Step DictionaryParser::ReadElements(bool fBehindValue) {
+    // NOLINTNEXTLINE(clang-analyzer-core.NullDereference): a frame always has its container
     ArrayValue& array = *static_cast<ArrayValue*>(stackM.Top().container);
     Bytes p = textscan::SkipWhitespace(pM, pEndM);
     if (!fBehindValue && FIsAt(p, pEndM, ']')) {
@@ -265,7 +266,7 @@ DictionaryParser::Step DictionaryParser::OpenElement(Bytes p, ArrayValue& array)
 
 DictionaryParser::Bytes DictionaryParser::AddScalarMember(Bytes p, Dictionary& object, const Member& member) {
     DictValue* value = nullptr;
-    const char* words = nullptr;
+    const char* words = "";
     const Bytes behind = ReadScalarAt(p, pEndM, pMempoolM, value, words);
     if (behind == nullptr) {
         const std::string_view key = ViewOf(member.key);
@@ -278,7 +279,7 @@ DictionaryParser::Bytes DictionaryParser::AddScalarMember(Bytes p, Dictionary& o
 
 DictionaryParser::Bytes DictionaryParser::AddScalarElement(Bytes p, ArrayValue& array) {
     DictValue* value = nullptr;
-    const char* words = nullptr;
+    const char* words = "";
     const Bytes behind = ReadScalarAt(p, pEndM, pMempoolM, value, words);
     if (behind == nullptr) return Fail(p, {words, scalarElementWrapperG, ElementWrapper()});
     if (array.AddNew(value)) [[likely]]

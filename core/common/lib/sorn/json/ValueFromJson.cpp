@@ -28,7 +28,7 @@ ref<Dictionary> Dictionary::FromJson(const unsigned char* data, unsigned length,
 
 ref<Dictionary> Dictionary::FromJson(const RoxString& text, RoxString& error, RoxMempool* pool) {
     // The words may replace the text when one string is both.
-    const RoxString held = text;
+    const RoxString held = text;  // NOLINT(performance-unnecessary-copy-initialization)
     return FromJson(reinterpret_cast<const unsigned char*>(held.Utf8()), held.NByte(), error, pool);
 }
 
