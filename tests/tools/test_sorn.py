@@ -246,7 +246,12 @@ class Convert(unittest.TestCase):
                 first = tool.stdout.read(1)
                 time.sleep(1.5)  # the pipe is full and the tool waits: its work takes more than a second
                 out = first + tool.stdout.read()
-            shown = os.read(leader, 65536)
+            shown = b""
+            try:
+                while piece := os.read(leader, 65536):
+                    shown += piece
+            except OSError:  # a terminal ends so when its last writer is gone
+                pass
             os.close(leader)
             return shown, out
 
