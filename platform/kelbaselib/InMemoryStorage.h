@@ -12,7 +12,8 @@ class InMemoryStorage final : public RoxCore {
     InMemoryStorage() = default;
     ~InMemoryStorage() override;
 
-    /// Appends and gives how many bytes were taken, fewer than `count` at the limit of 32 bits.
+    /// Appends and gives how many bytes were taken, fewer than `count` at the limit of 32 bits. The bytes may
+    /// be the storage's own.
     unsigned Append(const void* bytes, unsigned count);
     /// Copies up to `capacity` bytes from `position` on and gives how many.
     unsigned Copy(unsigned position, void* buffer, unsigned capacity) const;

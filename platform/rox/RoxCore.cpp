@@ -96,6 +96,15 @@ void RoxCore::DestroyNow(RoxCore* p) {
     RoxMempool::FreeIn(pool, p);
 }
 
+void RoxCore::DestroyDeferred(const RoxMempool& pool) {
+    DestroyState& state = destroyStateG;
+    // Not beyond what the pool needs: were all destroyed whose destructors have pools of their own, each
+    // would do so for the next, on ever more stack.
+    while (state.pDeferred != nullptr && pool.GetUsedBytes() != 0) {
+        DestroyNow(RoxDeferredList::Pop(state.pDeferred));
+    }
+}
+
 void RoxCore::Destroy(RoxCore* p) {
     p->countM.load(std::memory_order_acquire);  // what other holders did to the object comes before its end
     DestroyState& state = destroyStateG;

@@ -29,18 +29,12 @@ class RoxCore {
     RoxMempool* GetMempool() const { return pMempoolM; }
     uint32_t GetRefCount() const { return countM.load(std::memory_order_relaxed); }
 
-    void UpRef() {
-        // An object without a holder is its maker's alone, and needs no read-modify-write.
-        if (countM.load(std::memory_order_relaxed) == 0) {
-            countM.store(1, std::memory_order_relaxed);
-        } else {
-            countM.fetch_add(1, std::memory_order_relaxed);
-        }
-    }
+    void UpRef() { countM.fetch_add(1, std::memory_order_relaxed); }
 
     /// Takes 1 from the count and destroys the object when that leaves 0. Null does nothing. Destruction of
     /// chains of any length takes bounded stack: beyond a small depth, dying objects wait in a list of the
-    /// thread, which the outermost DownRef empties before it returns.
+    /// thread, which the outermost DownRef empties before it returns. A pool that ends meanwhile sees to the
+    /// waiting objects first.
     static void DownRef(RoxCore* p) {
         if (p == nullptr) {
             return;
@@ -51,6 +45,12 @@ class RoxCore {
             Destroy(p);
         }
     }
+
+    /// Destroys this thread's waiting objects, the latest first, until the pool has no live block or none
+    /// waits. The pool's destructor calls it, for the waiting ones may lie in the pool or hold what does.
+    /// Takes stack for each such call inside another: for a dying object that owns a pool which others keep
+    /// in use.
+    static void DestroyDeferred(const RoxMempool& pool);
 
     /// Allocates and leaves the pool in the raw memory for the constructor. Null pool: general heap.
     static void* operator new(size_t size, RoxMempool* pool);

@@ -7,6 +7,7 @@
 #include <new>
 
 #include "rox/RoxAssert.h"
+#include "rox/RoxCore.h"
 #include "rox/RoxMempoolState.h"
 #include "rox/RoxMempoolSystem.h"
 
@@ -68,6 +69,7 @@ RoxMempool::RoxMempool(const char* name) {
 }
 
 RoxMempool::~RoxMempool() {
+    RoxCore::DestroyDeferred(*this);
     LeakReporter reporter = leakReporterG.load(std::memory_order_acquire);
     if (reporter != nullptr) {
         size_t nBlocks = pStateM->CountBlocks();

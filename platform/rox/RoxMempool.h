@@ -8,8 +8,8 @@ class RoxMempoolState;
 ///
 /// Blocks come in size classes: multiples of 8 up to 128 bytes, of 16 up to 256, then four classes to each
 /// doubling up to 16,384 bytes. Larger blocks are mapped one by one in whole pages of 4,096 bytes. A block is
-/// aligned to 8 bytes, and to 16 when its class is a multiple of 16, which covers every type whose size is
-/// the requested one.
+/// aligned to 8 bytes, and to 16 when its class is a multiple of 16, which covers every type that asks for at
+/// most 16 and whose size is the requested one. More than 16 is never promised.
 ///
 /// Every operation may be called from any thread at any time. The thread that allocates first becomes the
 /// pool's owner and takes no lock and no atomic read-modify-write; when it ends, another thread takes its
@@ -22,8 +22,9 @@ class RoxMempool {
  public:
     /// An empty pool; `name` (copied) shows in reports. No memory is mapped before the first allocation.
     explicit RoxMempool(const char* name);
-    /// Gives everything back to the system; blocks that still live are gone with the pool. If there are any,
-    /// the leak reporter is called first.
+    /// Destroys counted objects of this thread that only wait for their destruction, if they may use the pool
+    /// (RoxCore::DestroyDeferred). Then gives everything back to the system; blocks that still live are gone
+    /// with the pool. If there are any, the leak reporter is called first.
     ~RoxMempool();
     RoxMempool(const RoxMempool&) = delete;
     RoxMempool& operator=(const RoxMempool&) = delete;

@@ -5,7 +5,7 @@
 /// Spin lock for short sections; not recursive. Waits by polling, then yields the processor.
 class RoxSpinLock {
  public:
-    /// `level` orders locks for debug checks: a thread takes them in ascending order.
+    /// `level` tells readers the order of locks: a thread takes them ascending. Nothing checks it.
     constexpr explicit RoxSpinLock(unsigned level) : levelM(level) {}
     RoxSpinLock(const RoxSpinLock&) = delete;
     RoxSpinLock& operator=(const RoxSpinLock&) = delete;

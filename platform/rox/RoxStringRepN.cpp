@@ -1,14 +1,20 @@
 #include "rox/RoxStringRepN.h"
 
+#include "rox/RoxAssert.h"
 #include "rox/RoxHashBytes.h"
 #include "rox/RoxMempool.h"
 
 RoxStringRepN* RoxStringRepN::Resize(RoxStringRepN* rep, uint32_t n) {
-    void* memory = RoxMempool::ReallocIn(rep->pMempoolM, rep, bytesOffset + n + size_t{1});
+    void* memory = RoxMempool::ReallocIn(rep->pMempoolM, rep, BlockBytes(rep->pMempoolM, n));
     RoxStringRepN* resized = static_cast<RoxStringRepN*>(memory);
     resized->lengthM = n;
     resized->MutableBytes()[n] = 0;
     return resized;
+}
+
+void RoxStringRepN::FailTooLong(const RoxMempool* pool, uint32_t n) {
+    RoxAssertFail("out of memory: pool %s, text of %lu bytes",
+                  pool != nullptr ? pool->GetName() : "(general heap)", static_cast<unsigned long>(n));
 }
 
 uint32_t RoxStringRepN::ComputeHash() const {

@@ -13,10 +13,10 @@
 class RoxStringRepN {
  public:
     /// A representation of n > 0 bytes (uninitialised, NUL set behind them) with a count of 1; the caller
-    /// fills it through MutableBytes before anybody else sees it.
+    /// fills it through MutableBytes before anybody else sees it. As in the pool, a size that cannot be ends
+    /// in RoxAssertFail.
     static RoxStringRepN* New(RoxMempool* pool, uint32_t n) {
-        RoxStringRepN* rep =
-            new (RoxMempool::MallocIn(pool, bytesOffset + n + size_t{1})) RoxStringRepN(pool, n);
+        RoxStringRepN* rep = new (RoxMempool::MallocIn(pool, BlockBytes(pool, n))) RoxStringRepN(pool, n);
         rep->MutableBytes()[n] = 0;
         return rep;
     }
@@ -48,6 +48,14 @@ class RoxStringRepN {
  private:
     RoxStringRepN(RoxMempool* pool, uint32_t n) : pMempoolM(pool), countM(1), lengthM(n), hashM(0) {}
     ~RoxStringRepN() = default;
+    static size_t BlockBytes(const RoxMempool* pool, uint32_t n) {
+        uint64_t bytes = uint64_t{bytesOffset} + n + 1;
+        if (bytes != static_cast<size_t>(bytes)) {
+            FailTooLong(pool, n);  // on a 32-bit host only
+        }
+        return static_cast<size_t>(bytes);
+    }
+    [[noreturn]] static void FailTooLong(const RoxMempool* pool, uint32_t n);
     uint32_t ComputeHash() const;
     void Delete();
 

@@ -59,7 +59,7 @@ _RoxHashTable::~_RoxHashTable() {
 }
 
 uint32_t _RoxHashTable::TagOf(const void* key) const {
-    return !FIndexed() && FStringKeys() ? QuickTag(TextOf(key)) : pHooksM->hash(key);
+    return !FIndexed() && FStringKeys() ? QuickTag(TextOf(key)) : _Hash(key);
 }
 
 /// The slot in use with that tag for whose key `equal` is true, or noSlot.
@@ -95,7 +95,7 @@ inline unsigned _RoxHashTable::FindSlotTagged(uint32_t tag, const void* key) con
         std::string_view text = TextOf(key);
         return Search(tag, [&](const void* other) { return other == key || FEqualText(other, text); });
     }
-    return Search(tag, [&](const void* other) { return pHooksM->compare(other, key) == 0; });
+    return Search(tag, [&](const void* other) { return _Compare(other, key) == 0; });
 }
 
 _RoxHashTable::Entry* _RoxHashTable::_Lookup(const void* key) const {
@@ -115,6 +115,7 @@ _RoxHashTable::Entry* _RoxHashTable::_LookupUtf8(const char* bytes, size_t n) co
 }
 
 void _RoxHashTable::_Store(Entry* entry) {
+    ShrinkIfSparse();
     Put(entry, TagOf(entry->pKey));
     if (fOwnM) {
         pHooksM->own(pMempoolM, entry);
@@ -122,6 +123,7 @@ void _RoxHashTable::_Store(Entry* entry) {
 }
 
 _RoxHashTable::Entry* _RoxHashTable::_StoreIfAbsent(void* key, bool& fStored) {
+    ShrinkIfSparse();
     uint32_t tag = TagOf(key);
     unsigned slot = FindSlotTagged(tag, key);
     fStored = slot == noSlot;
@@ -152,6 +154,8 @@ inline void _RoxHashTable::Put(Entry* entry, uint32_t tag) {
 }
 
 bool _RoxHashTable::_Remove(const void* key) {
+    // Before the removal, not behind it: what is disowned may change this table, or end it.
+    ShrinkIfSparse();
     unsigned slot = FindSlot(key);
     if (slot == noSlot) {
         return false;
@@ -166,6 +170,10 @@ void _RoxHashTable::RemoveSlot(unsigned slot) {
     --nLiveM;
     if (nLiveM == 0 && !FIndexed()) {
         nSlotM = 0;
+        firstSlotM = 0;
+    }
+    while (firstSlotM < nSlotM && vEntryM[firstSlotM] == nullptr) {
+        ++firstSlotM;
     }
     if (fOwnM) {
         pHooksM->disown(pMempoolM, entry);
@@ -179,7 +187,7 @@ void _RoxHashTable::Clear() {
     vEntryM = nullptr;
     vTagM = nullptr;
     pIndexM = nullptr;
-    nLiveM = nSlotM = capacityM = indexMaskM = 0;
+    nLiveM = nSlotM = firstSlotM = capacityM = indexMaskM = 0;
     for (unsigned i = 0; fOwnM && i < n; ++i) {
         if (entries[i] != nullptr) {
             pHooksM->disown(pMempoolM, entries[i]);
@@ -198,6 +206,14 @@ void _RoxHashTable::MakeRoom() {
     } else {
         RoxAssert(capacityM < maxEntries, "_RoxHashTable: too many entries");
         Rebuild(std::min(capacityM * 2, maxEntries));
+    }
+}
+
+/// Closes the gaps when fewer than a quarter of the slots are in use. Never in RemoveSlot, which a walk
+/// calls: its place is a slot.
+inline void _RoxHashTable::ShrinkIfSparse() {
+    if (nSlotM > linearLimit && nLiveM < nSlotM / 4) [[unlikely]] {
+        Rebuild(std::max(linearLimit, nLiveM * 2));
     }
 }
 
@@ -223,7 +239,7 @@ void _RoxHashTable::Rebuild(unsigned capacity) {
         memset(pIndexM, 0, static_cast<size_t>(nIndex) * sizeof(uint32_t));
     }
     capacityM = capacity;
-    nSlotM = 0;
+    nSlotM = firstSlotM = 0;
     for (unsigned i = 0; i < nOld; ++i) {
         if (oldEntries[i] == nullptr) {
             continue;

@@ -11,7 +11,8 @@ class RoxStringRepN;
 
 /// Hash table of two-word entries, which its users allocate with the pool's Calloc. Entries never move. Up to
 /// 16 entries are searched by a linear scan, more through an index. At most 2^30 entries. Allocates nothing
-/// before the first _Store. Not thread-safe.
+/// before the first _Store. A table that has lost most of its entries shrinks at the next _Store or _Remove,
+/// so that walks cost what is there. Not thread-safe.
 class _RoxHashTable {
  public:
     struct Entry {
@@ -55,6 +56,10 @@ class _RoxHashTable {
     /// Removes all entries.
     void Clear();
 
+    /// The functions for keys that the table was given.
+    uint32_t _Hash(const void* key) const { return pHooksM->hash(key); }
+    int _Compare(const void* a, const void* b) const { return pHooksM->compare(a, b); }
+
     unsigned Count() const { return nLiveM; }
     /// Asks the processor for what a walk reads first.
     void _Prefetch() const { __builtin_prefetch(vEntryM); }
@@ -83,6 +88,7 @@ class _RoxHashTable {
     void Put(Entry* entry, uint32_t tag);
     void RemoveSlot(unsigned slot);
     void MakeRoom();
+    void ShrinkIfSparse();
     void Rebuild(unsigned capacity);
     void IndexSlot(unsigned slot);
 
@@ -93,6 +99,8 @@ class _RoxHashTable {
     uint32_t* pIndexM = nullptr;  // open addressing: slot + 1, or 0; only in tables above the linear limit
     uint32_t nLiveM = 0;
     uint32_t nSlotM = 0;
+    uint32_t firstSlotM =
+        0;  // no entry before it: walks of a table that is emptied from the front start here
     uint32_t capacityM = 0;
     uint32_t indexMaskM = 0;
     uint32_t initialSizeM;

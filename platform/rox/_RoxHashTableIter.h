@@ -6,7 +6,9 @@
 /// RemoveCurrent; any other change of the table ends the walk's validity.
 class _RoxHashTableIter {
  public:
-    explicit _RoxHashTableIter(_RoxHashTable& table) : pTableM(&table) { SkipRemoved(); }
+    explicit _RoxHashTableIter(_RoxHashTable& table) : pTableM(&table), slotM(table.firstSlotM) {
+        SkipRemoved();
+    }
 
     /// True while the walk stands on an entry: false at the end, and after RemoveCurrent until Next.
     bool FCurrent() const { return slotM < pTableM->nSlotM && pTableM->vEntryM[slotM] != nullptr; }
@@ -28,5 +30,5 @@ class _RoxHashTableIter {
     }
 
     _RoxHashTable* pTableM;
-    unsigned slotM = 0;
+    unsigned slotM;
 };

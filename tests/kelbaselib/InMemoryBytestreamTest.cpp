@@ -137,6 +137,23 @@ TEST(InMemoryBytestreamTest, GrowthCopiesLittle) {
     EXPECT_LE(nMoves, 21u);  // 2^20 > 1,000,000
 }
 
+TEST(InMemoryBytestreamTest, TakesItsOwnBytes) {
+    for (size_t length : {1u, 2u, 64u, 1000u, 40000u}) {
+        for (size_t offset : {size_t{0}, length / 2, length - 1}) {
+            RoxMempool pool("streams");
+            InMemoryBytestream stream(&pool);
+            std::string expected = Pattern(length);
+            stream.Write(expected.data(), static_cast<unsigned>(length));
+            for (int i = 0; i < 6; ++i) {  // each at least half as long again: the storage moves on the way
+                unsigned n = static_cast<unsigned>(expected.size() - offset);
+                EXPECT_EQ(n, stream.Write(stream.GetData() + offset, n));
+                expected += expected.substr(offset);
+            }
+            EXPECT_EQ(expected, ReadAll(stream, 4096)) << length << " " << offset;
+        }
+    }
+}
+
 TEST(InMemoryBytestreamTest, FinishedStreamIsReadByManyThreads) {
     InMemoryBytestream stream;
     std::string text = Pattern(20000);

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <stdexcept>
 #include <thread>
 #include <vector>
@@ -242,12 +243,166 @@ TEST_F(CoreTest, AllIsDestroyedWhenTheOutermostReleaseReturns) {
     EXPECT_EQ(0u, pool.GetUsedBytes());
 }
 
+namespace {
+
+/// Has a pool of its own, which its child may lie in.
+class PoolHolder : public RoxCore {
+ public:
+    ~PoolHolder() override { ++nDestroyedG; }
+    RoxMempool pool{"held"};
+    ref<RoxCore> child;
+};
+
+/// A chain link in front of any object.
+class Link : public RoxCore {
+ public:
+    explicit Link(ref<RoxCore> held) : next(std::move(held)) {}
+    ~Link() override { ++nDestroyedG; }
+    ref<RoxCore> next;
+};
+
+ref<RoxCore> Behind(unsigned nLinks, ref<RoxCore> last) {
+    for (unsigned i = 0; i < nLinks; ++i) {
+        last = ref<RoxCore>(new Link(std::move(last)));
+    }
+    return last;
+}
+
+unsigned nLeaksG = 0;
+void CountLeak(const char*, size_t, size_t) {
+    ++nLeaksG;
+}
+
+/// Counts the pools that end with live blocks.
+class LeakCount {
+ public:
+    LeakCount() {
+        nLeaksG = 0;
+        RoxMempool::SetLeakReporter(&CountLeak);
+    }
+    ~LeakCount() { RoxMempool::SetLeakReporter(nullptr); }
+};
+
+/// Its destructor makes a pool with objects in it.
+class Maker : public RoxCore {
+ public:
+    explicit Maker(unsigned n) : nLinks(n) {}
+    ~Maker() override {
+        RoxMempool pool("local");
+        ref<Node> chain = MakeChain(nLinks, {&pool});
+        ++nDestroyedG;
+    }
+    unsigned nLinks;
+};
+
+}  // namespace
+
+TEST_F(CoreTest, PoolThatDiesInAChainOutlivesItsObjects) {
+    LeakCount leaks;
+    for (unsigned nBefore : {0u, 3u, 13u, 14u, 15u, 16u, 17u, 40u}) {
+        for (unsigned nWithin : {1u, 3u, 15u, 40u}) {
+            nDestroyedG = 0;
+            ref<PoolHolder> holder = new PoolHolder;
+            holder->child = MakeChain(nWithin, {&holder->pool});
+            ref<RoxCore> chain = Behind(nBefore, std::move(holder));
+            chain = nullptr;
+            EXPECT_EQ(nBefore + 1 + nWithin, nDestroyedG) << nBefore << " " << nWithin;
+        }
+    }
+    EXPECT_EQ(0u, nLeaksG);
+}
+
+TEST_F(CoreTest, PoolThatDiesInAChainWaitsForObjectsThatHoldItsOwn) {
+    // The first child, which lies elsewhere, waits while the holder dies, and holds the last use of its pool.
+    LeakCount leaks;
+    for (unsigned nBefore : {0u, 3u, 14u, 15u, 16u, 40u}) {
+        nDestroyedG = 0;
+        ref<PoolHolder> holder = new PoolHolder;
+        holder->child = new Link(MakeChain(2, {&holder->pool}));
+        ref<RoxCore> chain = Behind(nBefore, std::move(holder));
+        chain = nullptr;
+        EXPECT_EQ(nBefore + 4, nDestroyedG) << nBefore;
+    }
+    EXPECT_EQ(0u, nLeaksG);
+}
+
+TEST_F(CoreTest, PoolsWithinPoolsDieInOrder) {
+    LeakCount leaks;
+    ref<PoolHolder> outermost = new PoolHolder;
+    PoolHolder* innermost = outermost.get();
+    for (unsigned i = 0; i < 40; ++i) {
+        PoolHolder* inner = new (&innermost->pool) PoolHolder;
+        innermost->child = inner;
+        innermost = inner;
+    }
+    outermost = nullptr;
+    EXPECT_EQ(41u, nDestroyedG);
+    EXPECT_EQ(0u, nLeaksG);
+}
+
+TEST_F(CoreTest, DestructorMayMakeAPoolOfItsOwn) {
+    LeakCount leaks;
+    for (unsigned nBefore : {0u, 3u, 14u, 15u, 16u, 40u}) {
+        for (unsigned nLinks : {1u, 15u, 40u}) {
+            nDestroyedG = 0;
+            ref<RoxCore> chain = Behind(nBefore, new Maker(nLinks));
+            chain = nullptr;
+            EXPECT_EQ(nBefore + 1 + nLinks, nDestroyedG) << nBefore << " " << nLinks;
+        }
+    }
+    EXPECT_EQ(0u, nLeaksG);
+}
+
+TEST_F(CoreTest, ManyWaitingObjectsWithPoolsDieOnASmallStack) {
+    class Crowd : public RoxCore {
+     public:
+        std::vector<ref<RoxCore>> vMember;
+    };
+    constexpr unsigned n = 20000;
+    LeakCount leaks;
+    ref<Crowd> crowd = new Crowd;
+    for (unsigned i = 0; i < n; ++i) {
+        crowd->vMember.push_back(new Maker(2));
+    }
+    ref<RoxCore> chain = Behind(15, std::move(crowd));
+    RunOnSmallStack([&] { chain = nullptr; });
+    EXPECT_EQ(15 + n * 3, nDestroyedG);
+    EXPECT_EQ(0u, nLeaksG);
+}
+
 TEST_F(CoreTest, DeletedHeadOfAChainReleasesAll) {
     RoxMempool pool("deleted");
     Node* head = new (&pool) Node;
     head->left = MakeChain(50000, {&pool});
     RunOnSmallStack([&] { delete head; });
     EXPECT_EQ(50001u, nDestroyedG);
+    EXPECT_EQ(0u, pool.GetUsedBytes());
+}
+
+TEST_F(CoreTest, ThreadsMayTakeTheFirstReferencesTogether) {
+    constexpr unsigned nThreads = 4;
+    RoxMempool pool("threads");
+    for (unsigned round = 0; round < 300; ++round) {
+        Counted* object = new (&pool) Counted;
+        std::atomic<unsigned> nReady{0};
+        std::vector<std::thread> threads;
+        for (unsigned i = 0; i < nThreads; ++i) {
+            threads.emplace_back([&] {
+                ++nReady;
+                while (nReady.load() != nThreads) {
+                }
+                object->UpRef();
+            });
+        }
+        for (std::thread& thread : threads) {
+            thread.join();
+        }
+        ASSERT_EQ(nThreads, object->GetRefCount()) << round;
+        for (unsigned i = 0; i < nThreads; ++i) {
+            RoxCore::DownRef(object);
+        }
+    }
+    EXPECT_EQ(300u, nDestroyedG);
     EXPECT_EQ(0u, pool.GetUsedBytes());
 }
 

@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <chrono>
 #include <map>
 #include <set>
 #include <string>
@@ -173,6 +175,118 @@ TEST(HashTableTest, RemovalDuringAWalkVisitsEachEntryOnce) {
             EXPECT_EQ(n, Contents(table).size());
             EXPECT_EQ(100000u, table.Find("name0")->number);
         }
+    }
+}
+
+namespace {
+
+/// Milliseconds that it takes to empty a table of n entries, one fresh walk for each.
+double MillisecondsToDrain(unsigned n) {
+    RoxMempool pool("tables");
+    Table table(&pool);
+    for (unsigned i = 0; i < n; ++i) {
+        table.Add(Name(&pool, i), nullptr);
+    }
+    auto start = std::chrono::steady_clock::now();
+    while (table.Count() != 0) {
+        _RoxHashTableIter iter(table);
+        iter.RemoveCurrent();
+    }
+    std::chrono::duration<double, std::milli> time = std::chrono::steady_clock::now() - start;
+    EXPECT_FALSE(_RoxHashTableIter(table).FCurrent());
+    return time.count();
+}
+
+}  // namespace
+
+TEST(HashTableTest, FreshWalksEmptyATableInTimeOfItsSize) {
+    // 16 times the entries: 256 times the time if each walk began at the first slot that ever was.
+    constexpr unsigned n = 12500;
+    double small = MillisecondsToDrain(n);
+    double large = MillisecondsToDrain(16 * n);
+    for (int i = 0; i < 4; ++i) {
+        small = std::min(small, MillisecondsToDrain(n));
+        large = std::min(large, MillisecondsToDrain(16 * n));
+    }
+    EXPECT_LT(large, 80 * small);
+}
+
+TEST(HashTableTest, WalksBeginAtTheFirstEntryWhateverHappenedBefore) {
+    for (unsigned n : {3u, 16u, 17u, 200u}) {
+        RoxMempool pool("tables");
+        Table table(&pool);
+        for (unsigned i = 0; i < n; ++i) {
+            table.Add(Name(&pool, i), Make(&pool, i).get());
+        }
+        for (unsigned i = n / 2; i != 0; --i) {  // from the middle back to the front: a gap that closes late
+            ASSERT_TRUE(table.Remove(Name(nullptr, i - 1)));
+            ASSERT_EQ(n - (n / 2 - i + 1), Contents(table).size());
+        }
+        for (unsigned i = 0; i < 2 * n; ++i) {  // the storage grows, or is rebuilt, behind the gap
+            table.Add(Name(&pool, n + i), Make(&pool, i).get());
+            ASSERT_EQ(n - n / 2 + i + 1, Contents(table).size());
+        }
+        while (table.Count() != 0) {
+            _RoxHashTableIter iter(table);
+            ASSERT_TRUE(iter.FCurrent());
+            iter.RemoveCurrent();
+        }
+        table.Add(Name(&pool, 0), Make(&pool, 5).get());
+        EXPECT_EQ(1u, Contents(table).size());
+        table.Clear();
+        table.Add(Name(&pool, 1), Make(&pool, 6).get());
+        EXPECT_EQ(1u, Contents(table).size());
+    }
+}
+
+TEST(HashTableTest, ATableThatLostItsEntriesShrinks) {
+    for (unsigned nLeft : {0u, 1u, 5u, 16u, 17u, 300u}) {
+        RoxMempool pool("tables");
+        Table table(&pool);
+        for (unsigned i = 0; i < 20000; ++i) {
+            table.Add(Name(&pool, i), Make(&pool, i).get());
+        }
+        const size_t usedByOne = pool.GetUsedBytes() / 20000;
+        for (unsigned i = nLeft; i < 20000; ++i) {
+            ASSERT_TRUE(table.Remove(Name(nullptr, i)));
+        }
+        EXPECT_LE(pool.GetUsedBytes(), (4 * nLeft + 40) * usedByOne) << nLeft;
+        EXPECT_EQ(nLeft, Contents(table).size());
+        for (unsigned i = 0; i < 100; ++i) {
+            EXPECT_EQ(i < nLeft, table.Find(Name(nullptr, i)) != nullptr) << i;
+        }
+        table.Add(Name(&pool, 50000), Make(&pool, 1).get());
+        EXPECT_EQ(nLeft + 1, Contents(table).size());
+    }
+}
+
+TEST(HashTableTest, ATableEmptiedByAWalkShrinksAtTheNextStore) {
+    for (bool fIfAbsent : {false, true}) {
+        RoxMempool pool("tables");
+        Table table(&pool);
+        for (unsigned i = 0; i < 20000; ++i) {
+            table.Add(Name(&pool, i), Make(&pool, i).get());
+        }
+        unsigned nVisited = 0;
+        for (_RoxHashTableIter iter(table); iter.FCurrent(); iter.Next()) {
+            ++nVisited;
+            if (Table::ValueOf(iter)->number != 7) {
+                iter.RemoveCurrent();
+            }
+        }
+        EXPECT_EQ(20000u, nVisited);
+        EXPECT_GT(pool.GetUsedBytes(), 100000u);  // the walk itself leaves the slots where they are
+        if (fIfAbsent) {
+            bool fStored = false;
+            RoxString key = Name(&pool, 7);
+            table._StoreIfAbsent(key.GetRepN(), fStored);
+            EXPECT_FALSE(fStored);
+        } else {
+            table.Add(Name(&pool, 8), Make(&pool, 8).get());
+        }
+        EXPECT_LT(pool.GetUsedBytes(), 4096u);
+        EXPECT_EQ(7u, table.Find("name7")->number);
+        EXPECT_EQ(fIfAbsent ? 1u : 2u, Contents(table).size());
     }
 }
 
@@ -353,6 +467,23 @@ TEST(HashTableTest, TableThatDoesNotOwnCallsNoHooks) {
     }
     EXPECT_EQ(0u, nOwnedG + nDisownedG);
     EXPECT_EQ(Number(2), entry.pData);
+}
+
+TEST(HashTableTest, TableCallsTheKeyFunctionsItWasGiven) {
+    constexpr _RoxHashTable::Hooks hooks = {
+        nullptr, nullptr,
+        [](const void* key) { return 3 * static_cast<uint32_t>(reinterpret_cast<uintptr_t>(key)); },
+        [](const void* a, const void* b) {
+            return static_cast<int>(reinterpret_cast<uintptr_t>(a) * 10 + reinterpret_cast<uintptr_t>(b));
+        }};
+    _RoxHashTable table(nullptr, 5, false, &hooks, roxMempoolUserNone, 0);
+    EXPECT_EQ(21u, table._Hash(Number(7)));
+    EXPECT_EQ(75, table._Compare(Number(7), Number(5)));
+    Table texts(nullptr);
+    RoxString a("abc");
+    RoxString b("abc");
+    EXPECT_EQ(_RoxHashTable::HashRoxStringRepN(b.GetRepN()), texts._Hash(a.GetRepN()));
+    EXPECT_EQ(0, texts._Compare(a.GetRepN(), b.GetRepN()));
 }
 
 TEST(HashTableTest, KeyFunctions) {

@@ -2,12 +2,14 @@
 
 #include <gtest/gtest.h>
 
+#include <cstdint>
 #include <memory>
 #include <string>
 #include <thread>
 #include <vector>
 
 #include "rox/RoxMempool.h"
+#include "rox/RoxStringRepN.h"
 
 namespace {
 
@@ -338,3 +340,18 @@ TEST(StringTest, CopiesOnManyThreads) {
     }
     EXPECT_EQ(0u, pool.GetUsedBytes());
 }
+
+#if SIZE_MAX == UINT32_MAX
+TEST(StringDeathTest, TextThatFillsTheAddressSpaceIsRefused) {
+    // 16 bytes of header and the NUL: from 2^32 - 17 on, the sum would wrap to a small block.
+    RoxMempool pool("strings");
+    EXPECT_DEATH(RoxStringRepN::New(nullptr, 0xFFFFFFEF),
+                 "out of memory: pool \\(general heap\\), text of 4294967279 bytes");
+    EXPECT_DEATH(RoxStringRepN::New(&pool, 0xFFFFFFF0),
+                 "out of memory: pool strings, text of 4294967280 bytes");
+    EXPECT_DEATH(RoxStringRepN::Resize(RoxStringRepN::New(&pool, 1), 0xFFFFFFFF),
+                 "out of memory: pool strings, text of 4294967295 bytes");
+    volatile uint32_t longest = 0xFFFFFFEE;  // volatile: the compiler would warn of the size
+    EXPECT_DEATH(RoxStringRepN::New(&pool, longest), "out of memory: pool strings, 4294967295 bytes");
+}
+#endif

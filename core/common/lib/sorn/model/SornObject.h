@@ -43,21 +43,30 @@ class SornObject : public RoxCore {
     /// ToDictionary as JSON text.
     RoxString ToString(bool pretty, OrvoVersion version) const;
 
-    /// A deep copy in the object's pool of all that a dictionary can express, older variants of fields not
-    /// included; null on failure. The copy is always of this object's struct: `structIdHint` must be a valid
-    /// struct id but does not change the class.
+    /// A copy in the object's pool of all that a dictionary can express, older variants of fields not
+    /// included; null on failure. Sub-objects and bytes are copied, while the dictionaries of any-dict fields
+    /// and the bodies of lazy fields are shared with the original. Of a repeated lazy field only the first
+    /// element that is not null is copied, and a struct's own `type` field receives the struct's name. The
+    /// copy is always of this object's struct: `structIdHint` must be a valid struct id but does not change
+    /// the class.
     ref<SornObject> Clone(unsigned structIdHint) const;
 
-    /// Same struct and the same values in all current fields. A bytestring field that is set makes objects
-    /// differ, even from themselves, and two multi any-dict fields of equal length always agree; both are
-    /// kept for their users.
+    /// Same struct and the same values in all current fields; older variants of fields are not compared. The
+    /// odd answers below are kept for their users:
+    /// - A bytestring field that is required or multi makes objects differ, even from themselves and even
+    /// when
+    ///   it is empty; an optional one does as soon as it is set.
+    /// - Multi any-dict fields of equal length agree whatever they hold, but for null against an element.
+    /// - Only the low 16 bits of an enumeration count.
+    /// - NaN differs from itself, and 0.0 equals -0.0.
     bool operator==(const SornObject& other) const;
     bool operator!=(const SornObject& other) const { return !(*this == other); }
 
-    /// Compares two single members of a field at addresses a and b. A null reference equals only a null
-    /// reference.
+    /// Compares two single members of a field at addresses a and b, by the rules above; bytes always differ.
+    /// A null reference equals only a null reference.
     static bool SingleFieldEquals(const FieldInfo* field, void* a, void* b);
-    /// Compares two multi containers of a field at addresses a and b, element by element in order.
+    /// Compares two multi containers of a field at addresses a and b, element by element in order, by the
+    /// rules above; containers of bytes always differ.
     static bool MultiFieldEquals(const FieldInfo* field, void* a, void* b);
 
     /// The address of a field's member.
