@@ -58,7 +58,7 @@ class _Checker:
         return not self.problems
 
     def check_names_and_ids(self):
-        owners, names, classes = {}, {}, {}
+        owners, names, classes, prefixes = {}, {}, {}, {}
         for t in self.catalogue.structs + self.catalogue.enums:
             if not 1 <= t.id <= MAX_ID:
                 self.problem(t.place, f'id {t.id} of "{t.name}" is not from 1 to {MAX_ID}')
@@ -71,6 +71,11 @@ class _Checker:
                 self.problem(t.place, f'the name "{t.name}" is taken at {names[t.name].place}')
             elif classes.setdefault(t.class_name, t) is not t:
                 self.problem(t.place, f'"{t.name}" and "{classes[t.class_name].name}" give the same class name')
+            if t.class_name in layout.RESERVED_CLASSES:
+                self.problem(t.place, f'the class name "{t.class_name}" of "{t.name}" has a meaning in generated code')
+        for s in self.catalogue.structs:
+            if s.prefix is not None and (other := prefixes.setdefault(s.prefix, s)) is not s:
+                self.problem(s.place, f'the prefix "{s.prefix}" of "{s.name}" is that of "{other.name}" at {other.place}')
 
     def check_struct(self, struct):
         if struct.prefix is not None and not _PREFIX.fullmatch(struct.prefix):
@@ -94,6 +99,8 @@ class _Checker:
                 self.problem(form.place, f'the field name "{form.name}" is taken at {seen[form.name].place}')
             if form.name in layout.RESERVED:
                 self.problem(form.place, f'the field name "{form.name}" is a member of every record')
+            elif form.name in layout.TAKEN:
+                self.problem(form.place, f'the field name "{form.name}" has a meaning in generated code')
             for one in (form, *f.older):
                 self.check_reference(one)
             self.check_versions(f)
@@ -168,6 +175,8 @@ class _Checker:
                 self.problem(v.place, f'"{v.name}" and "{other.name}" give the same C++ name')
         if enum.row_per_id:
             self.check_rows(enum, numbers)
+        elif enum.values and not enum.is_open and previous + 1 < enum.count:
+            self.problem(enum.place, f'the count {enum.count} of "{enum.name}" is not its highest value {previous} + 1')
 
     def check_rows(self, enum, numbers):
         for t in self.catalogue.structs + self.catalogue.enums:

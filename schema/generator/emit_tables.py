@@ -47,14 +47,17 @@ _NONE = "// Stands for an index without an entry.\nconstexpr decltype(nullptr) n
 
 
 def emit_enum_tables(enums):
-    """`Enums.cpp`: names of every enumeration, and `Schema::vEnumDefG`."""
+    """`Enums.cpp`: names of every enumeration, and `Schema::vEnumDefG`.
+
+    The underscore, which no enumeration's name has, keeps the two variables of `x` apart from those of `vX`.
+    """
     lines = ['#include "sorn/model/Schema.h"', "", "namespace {", "", _NONE]
     for e in enums:
         values = {v.number: (f'"{v.name}"', v.number) for v in e.values}
         lines += [f"constinit const char* const v{e.class_name}G[{e.count}] = {{", *_dense(values, e.count), "};",
-                  f"constinit const sorn::EnumDef {_lower_first(e.class_name)}G = {{{e.count}, v{e.class_name}G}};", ""]
+                  f"constinit const sorn::EnumDef {e.class_name}_defG = {{{e.count}, v{e.class_name}G}};", ""]
     size = max((e.id for e in enums), default=0) + 1
-    entries = {e.id: (f"&{_lower_first(e.class_name)}G", e.id) for e in enums}
+    entries = {e.id: (f"&{e.class_name}_defG", e.id) for e in enums}
     lines += ["}  // namespace", "", "namespace sorn {", "",
               f"const uint32_t Schema::nEnumDefG = {size};", "",
               f"constinit const EnumDef* const Schema::vEnumDefG[{size}] = {{", *_dense(entries, size), "};", "",
@@ -98,7 +101,3 @@ def name_table(structs, size):
             i = (i + 1) % size
         table[i] = s
     return table
-
-
-def _lower_first(name):
-    return name[0].lower() + name[1:]

@@ -12,8 +12,17 @@ HEADER_SIZE = 16  # virtual table, pool, count, structId
 MAX_PRESENCE_OFFSET = 511
 MAX_STORAGE_OFFSET = 65535
 
-# Names that a field cannot have, because every class has a member so named.
-RESERVED = {"structId", "structInfoG", "vFieldInfoG", "vFieldInfoHistoryG", "pFieldNamesG", "classTagG"}
+# Names that a field cannot have, because every class has a member so named, of its own or of its bases.
+RESERVED = {"structId", "pMempoolM", "countM", "classTagG",
+            "structIdG", "structInfoG", "vFieldInfoG", "vFieldInfoHistoryG", "pFieldNamesG"}
+
+# Names that a field cannot have, because the generated code or the headers that it includes give them a meaning: the
+# template of the references, and macros of the C library.
+TAKEN = {"ref", "assert", "errno", "linux", "offsetof", "stderr", "stdin", "stdout", "unix"}
+
+# Names that a class cannot have: its own members, and what the generated code names without a namespace.
+RESERVED_CLASSES = {"Factory", "SetDebugLockOwner", "Loader", "RoxCore", "RoxGenericArray", "RoxGenericIntArray",
+                    "RoxLockId", "RoxMempool", "RoxString", "RoxStringArray"}
 
 _KEYWORDS = set("""
 alignas alignof and and_eq asm auto bitand bitor bool break case catch char char8_t char16_t char32_t class

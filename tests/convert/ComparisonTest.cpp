@@ -94,19 +94,28 @@ TEST_F(ComparisonTest, Numbers) {
     EXPECT_FALSE(SingleEquals("optionalBool", true, false));
     EXPECT_TRUE(SingleEquals("optionalS32", -1, -1));
     EXPECT_FALSE(SingleEquals("optionalS32", 1, 1 << 24));
+    EXPECT_TRUE(SingleEquals("optionalU32", 0x80000001u, 0x80000001u));
     EXPECT_FALSE(SingleEquals("optionalU32", 1u, 0x80000001u));
-    EXPECT_FALSE(SingleEquals("optionalIntId", 1u, 2u));
-    EXPECT_FALSE(SingleEquals("optionalDate", Date(1), Date(2)));
+    EXPECT_TRUE(SingleEquals("optionalIntId", 0x80000001u, 0x80000001u));
+    EXPECT_FALSE(SingleEquals("optionalIntId", 1u, 0x10001u));
+    EXPECT_TRUE(SingleEquals("optionalDate", Date(-1), Date(-1)));
+    EXPECT_FALSE(SingleEquals("optionalDate", Date(1), Date(0x10001)));
     EXPECT_TRUE(SingleEquals("optionalTime", Time(1), Time(1)));
     EXPECT_FALSE(SingleEquals("optionalTime", Time(1), Time(-1)));
+    EXPECT_TRUE(SingleEquals("optionalS64", INT64_MIN, INT64_MIN));
     EXPECT_FALSE(SingleEquals("optionalS64", int64_t{1}, (int64_t{1} << 40) + 1));
     EXPECT_TRUE(SingleEquals("optionalU64", UINT64_MAX, UINT64_MAX));
-    EXPECT_FALSE(SingleEquals("optionalLongId", uint64_t{1}, uint64_t{1} << 48));
+    EXPECT_FALSE(SingleEquals("optionalU64", uint64_t{1}, (uint64_t{1} << 63) + 1));
+    EXPECT_TRUE(SingleEquals("optionalLongId", (uint64_t{2} << 48) + 7, (uint64_t{2} << 48) + 7));
+    EXPECT_FALSE(SingleEquals("optionalLongId", uint64_t{7}, (uint64_t{2} << 48) + 7));
+    EXPECT_TRUE(SingleEquals("optionalDateTime", DateTime(int64_t{1} << 32), DateTime(int64_t{1} << 32)));
     EXPECT_FALSE(SingleEquals("optionalDateTime", DateTime(0), DateTime(int64_t{1} << 32)));
-    EXPECT_FALSE(SingleEquals("optionalChannel", ChannelNumber(7), ChannelNumber(7, 1)));
     EXPECT_TRUE(SingleEquals("optionalChannel", ChannelNumber(7), ChannelNumber(7)));
-    EXPECT_FALSE(SingleEquals("optionalCurrency", Currency(1, "USD"), Currency(1, "EUR")));
+    EXPECT_FALSE(SingleEquals("optionalChannel", ChannelNumber(7), ChannelNumber(7, 1)));
+    EXPECT_FALSE(SingleEquals("optionalChannel", ChannelNumber(7, 1), ChannelNumber(8, 1)));
     EXPECT_TRUE(SingleEquals("optionalCurrency", Currency(1, "USD"), Currency(1, "USD")));
+    EXPECT_FALSE(SingleEquals("optionalCurrency", Currency(1, "USD"), Currency(1, "EUR")));
+    EXPECT_FALSE(SingleEquals("optionalCurrency", Currency(1, "USD"), Currency(2, "USD")));
 }
 
 TEST_F(ComparisonTest, Floats) {
@@ -128,6 +137,7 @@ TEST_F(ComparisonTest, EnumerationsCompareTheirLow16Bits) {
 TEST_F(ComparisonTest, TextsCompareAllBytes) {
     EXPECT_TRUE(SingleEquals("optionalString", RoxString("a"), RoxString("a")));
     EXPECT_FALSE(SingleEquals("optionalString", RoxString("a"), RoxString("A")));
+    EXPECT_TRUE(SingleEquals("optionalStringId", RoxString("a"), RoxString("a")));
     EXPECT_FALSE(
         SingleEquals("optionalStringId", RoxString("a"), RoxString::FromUtf8Bytes(&pool, 3, "a\0b")));
     RoxStringArray a(&pool);
@@ -140,6 +150,7 @@ TEST_F(ComparisonTest, TextsCompareAllBytes) {
     a.Add(RoxString("y"));
     b.Add(RoxString("z"));
     EXPECT_FALSE(SornObject::MultiFieldEquals(Field("multiString"), &a, &b));
+    EXPECT_FALSE(SornObject::MultiFieldEquals(Field("multiStringId"), &a, &b));
 }
 
 TEST_F(ComparisonTest, RepeatedNumbers) {
@@ -148,11 +159,46 @@ TEST_F(ComparisonTest, RepeatedNumbers) {
     EXPECT_FALSE(MultiEquals<uint8_t>("multiBool", {1}, {1, 0}));
     EXPECT_TRUE(MultiEquals<int32_t>("multiS32", {1}, {1}));               // inside the container
     EXPECT_FALSE(MultiEquals<int32_t>("multiS32", {1, 2, 3}, {1, 2, 4}));  // outside
+    EXPECT_TRUE(MultiEquals<uint32_t>("multiU32", {1, 0x80000001u}, {1, 0x80000001u}));
+    EXPECT_FALSE(MultiEquals<uint32_t>("multiU32", {1, 1}, {1, 0x80000001u}));
+    EXPECT_TRUE(MultiEquals<int64_t>("multiS64", {1, INT64_MIN}, {1, INT64_MIN}));
     EXPECT_FALSE(MultiEquals<int64_t>("multiS64", {1, 2}, {1, int64_t{2} << 32}));
-    EXPECT_TRUE(MultiEquals<uint64_t>("multiLongId", {1, 2}, {1, 2}));
+    EXPECT_TRUE(MultiEquals<uint64_t>("multiU64", {1, UINT64_MAX}, {1, UINT64_MAX}));
+    EXPECT_FALSE(MultiEquals<uint64_t>("multiU64", {1, 1}, {1, (uint64_t{1} << 63) + 1}));
+}
+
+TEST_F(ComparisonTest, RepeatedIds) {
+    constexpr uint64_t longId = (uint64_t{2} << 48) + 7;
+    EXPECT_TRUE(MultiEquals<uint32_t>("multiIntId", {1, 0x80000001u}, {1, 0x80000001u}));
+    EXPECT_FALSE(MultiEquals<uint32_t>("multiIntId", {1, 1}, {1, 0x10001u}));
+    EXPECT_FALSE(MultiEquals<uint32_t>("multiIntId", {1, 2}, {2, 1}));
+    EXPECT_TRUE(MultiEquals<uint64_t>("multiLongId", {1, longId}, {1, longId}));
+    EXPECT_FALSE(MultiEquals<uint64_t>("multiLongId", {1, 7}, {1, longId}));
+    EXPECT_FALSE(MultiEquals<uint64_t>("multiLongId", {1}, {}));
+}
+
+TEST_F(ComparisonTest, RepeatedMoments) {
     EXPECT_TRUE(MultiEquals<Date>("multiDate", {}, {}));
+    EXPECT_TRUE(MultiEquals<Date>("multiDate", {Date(1), Date(-1)}, {Date(1), Date(-1)}));
+    EXPECT_FALSE(MultiEquals<Date>("multiDate", {Date(1), Date(1)}, {Date(1), Date(0x10001)}));
+    EXPECT_TRUE(MultiEquals<Time>("multiTime", {Time(1), Time(-1)}, {Time(1), Time(-1)}));
+    EXPECT_FALSE(MultiEquals<Time>("multiTime", {Time(1), Time(1)}, {Time(1), Time(0x1000001)}));
+    const DateTime late(int64_t{1} << 32);
+    EXPECT_TRUE(MultiEquals<DateTime>("multiDateTime", {DateTime(1), late}, {DateTime(1), late}));
+    EXPECT_FALSE(MultiEquals<DateTime>("multiDateTime", {DateTime(1), DateTime(0)}, {DateTime(1), late}));
+}
+
+TEST_F(ComparisonTest, RepeatedPairs) {
+    const ChannelNumber seven(7);
+    const ChannelNumber sub(7, 1);
+    EXPECT_TRUE(MultiEquals<ChannelNumber>("multiChannel", {seven, sub}, {seven, sub}));
+    EXPECT_FALSE(MultiEquals<ChannelNumber>("multiChannel", {seven, seven}, {seven, sub}));
+    EXPECT_FALSE(MultiEquals<ChannelNumber>("multiChannel", {seven, sub}, {seven, ChannelNumber(8, 1)}));
+    const Currency dollar(1, "USD");
+    EXPECT_TRUE(MultiEquals<Currency>("multiCurrency", {Currency(), dollar}, {Currency(), dollar}));
+    EXPECT_FALSE(MultiEquals<Currency>("multiCurrency", {dollar, dollar}, {dollar, Currency(1, "EUR")}));
+    EXPECT_FALSE(MultiEquals<Currency>("multiCurrency", {dollar, dollar}, {dollar, Currency(2, "USD")}));
     EXPECT_FALSE(MultiEquals<Currency>("multiCurrency", {Currency()}, {Currency(0, "USD")}));
-    EXPECT_FALSE(MultiEquals<ChannelNumber>("multiChannel", {ChannelNumber(1)}, {ChannelNumber(1, 1)}));
 }
 
 TEST_F(ComparisonTest, BytesAreNeverEqual) {
@@ -195,6 +241,7 @@ TEST_F(ComparisonTest, Objects) {
     ref<SornObject> otherStruct = Object(R"({"type": "everyTypePlain"})");
     EXPECT_TRUE(SingleEquals("optionalObject", a, same));
     EXPECT_FALSE(SingleEquals("optionalObject", a, other));
+    EXPECT_TRUE(SingleEquals("optionalKnownDict", a, same));
     EXPECT_FALSE(SingleEquals("optionalKnownDict", a, otherStruct));
     EXPECT_FALSE(SingleEquals("requiredObject", a, ref<SornObject>()));
     EXPECT_FALSE(SingleEquals("requiredObject", ref<SornObject>(), a));
@@ -202,6 +249,8 @@ TEST_F(ComparisonTest, Objects) {
     EXPECT_TRUE(
         MultiReferencesEqual("multiObject", {a.get(), same.get(), nullptr}, {same.get(), a.get(), nullptr}));
     EXPECT_FALSE(MultiReferencesEqual("multiObject", {a.get(), other.get()}, {other.get(), a.get()}));
+    EXPECT_TRUE(MultiReferencesEqual("multiKnownDict", {a.get(), nullptr}, {same.get(), nullptr}));
+    EXPECT_FALSE(MultiReferencesEqual("multiKnownDict", {a.get()}, {other.get()}));
     EXPECT_FALSE(MultiReferencesEqual("multiKnownDict", {a.get()}, {nullptr}));
     EXPECT_FALSE(MultiReferencesEqual("multiKnownDict", {a.get()}, {}));
 }

@@ -7,6 +7,7 @@
 #include "rox/RoxGenericArray.h"
 #include "rox/RoxGenericIntArray.h"
 #include "rox/RoxMempool.h"
+#include "rox/RoxMempoolPoison.h"
 #include "rox/RoxStringArray.h"
 #include "sorn/model/ChannelNumber.h"
 #include "sorn/model/Schema.h"
@@ -87,6 +88,7 @@ void ExpectEmptyMulti(const FieldInfo& field, const void* member, RoxMempool* po
         const auto* array = static_cast<const RoxStringArray*>(member);
         EXPECT_EQ(array->GetCount(), 0u) << where;
         EXPECT_EQ(array->GetMempool(), pool) << where;
+        EXPECT_EQ(array->GetDebugLockOwner(), 0u) << where;
     } else {
         const auto* array = static_cast<const RoxGenericArray*>(member);
         EXPECT_EQ(array->GetCount(), 0u) << where;
@@ -110,69 +112,112 @@ void ExpectEmptySingle(const FieldInfo& field, const void* member, const std::st
     }
 }
 
+void ExpectEmpty(const StructInfo& info, SornObject& object, RoxMempool* pool) {
+    for (const FieldInfo* field : AllForms(info)) {
+        const std::string where = std::string(info.name) + '.' + info.FieldName(*field);
+        if (field->presenceOffset != 0) {
+            EXPECT_EQ(reinterpret_cast<const char*>(&object)[field->presenceOffset], 0) << where;
+        }
+        if (field->arity == sorn::SORN_ARITY_MULTI) {
+            ExpectEmptyMulti(*field, object.MemberAt(*field), pool, where);
+        } else {
+            ExpectEmptySingle(*field, object.MemberAt(*field), where);
+        }
+    }
+}
+
+// Leaves a free block full of 0xA5 where the pool puts the next object of the struct; gives its address.
+// Fresh memory of a pool is zero, and would hide a member that the constructor leaves out.
+const void* SoilNextObject(const StructInfo& info, RoxMempool* pool) {
+    const size_t before = pool->GetUsedBytes();
+    ref<SornObject> object = info.Factory(pool);
+    const size_t bytes = pool->GetUsedBytes() - before - roxmempool::redzoneBytes;
+    object = nullptr;
+    void* block = pool->Malloc(bytes);
+    memset(block, 0xA5, bytes);
+    pool->Free(block);
+    return block;
+}
+
 TEST(FactoryTest, EveryStructMakesAnEmptyObject) {
     ASSERT_EQ(StructIds().size(), 286u);
     for (uint32_t id : StructIds()) {
         const StructInfo& info = *Schema::vStructDefG[id];
         RoxMempool pool("FactoryTest");
-        const size_t before = pool.GetUsedBytes();
+        const void* soiled = SoilNextObject(info, &pool);
         {
             const ref<SornObject> object = info.Factory(&pool);
+            ASSERT_EQ(static_cast<const void*>(object.get()), soiled) << info.name;
             EXPECT_EQ(object->structId, id);
             EXPECT_STREQ(object->GetTypeName().Utf8(), info.name);
             EXPECT_EQ(object->GetMempool(), &pool) << info.name;
             EXPECT_EQ(object->GetRefCount(), 1u) << info.name;
-            for (const FieldInfo* field : AllForms(info)) {
-                const std::string where = std::string(info.name) + '.' + info.FieldName(*field);
-                if (field->presenceOffset != 0) {
-                    EXPECT_EQ(reinterpret_cast<const char*>(object.get())[field->presenceOffset], 0) << where;
-                }
-                if (field->arity == sorn::SORN_ARITY_MULTI) {
-                    ExpectEmptyMulti(*field, object->MemberAt(*field), &pool, where);
-                } else {
-                    ExpectEmptySingle(*field, object->MemberAt(*field), where);
-                }
-            }
+            ExpectEmpty(info, *object, &pool);
         }
-        EXPECT_EQ(pool.GetUsedBytes(), before) << info.name;
+        EXPECT_EQ(pool.GetUsedBytes(), 0u) << info.name;
     }
 }
 
-// Puts something that must be given back into every member that owns memory.
-void Fill(const StructInfo& info, SornObject& object, RoxMempool* pool) {
+struct Filled {
+    unsigned nReferences = 0;  // to the child
+    unsigned nBlocks = 0;      // members that own memory of the pool
+};
+
+// Puts something that must be given back into every member that owns memory or holds references: into all
+// reference members, whatever their class, the same child.
+Filled Fill(const StructInfo& info, SornObject& object, SornObject* child, RoxMempool* pool) {
+    Filled filled;
     const RoxString text(pool, "a text that is too long for any word");
     const char vElement[8] = {1, 2, 3, 4, 5, 6, 7, 8};
     for (const FieldInfo* field : AllForms(info)) {
         void* member = object.MemberAt(*field);
         const bool fMulti = field->arity == sorn::SORN_ARITY_MULTI;
-        if (fMulti && ElementSize(field->dataType) != 0) {
+        if (ElementSize(field->dataType) != 0) {
+            if (!fMulti) continue;
             for (int i = 0; i < 20; ++i) EXPECT_TRUE(static_cast<RoxGenericIntArray*>(member)->Add(vElement));
-        } else if (fMulti && FStrings(field->dataType)) {
-            for (int i = 0; i < 3; ++i) EXPECT_TRUE(static_cast<RoxStringArray*>(member)->Add(text));
-        } else if (fMulti) {
-            const ref<SornObject> child = sornschema::Success::Factory(pool);
-            for (int i = 0; i < 3; ++i) EXPECT_TRUE(static_cast<RoxGenericArray*>(member)->Add(child.get()));
+            ++filled.nBlocks;
         } else if (FStrings(field->dataType)) {
-            *static_cast<RoxString*>(member) = text;
-        } else if (field->dataType == sorn::SORN_DATA_TYPE_OBJECT ||
-                   field->dataType == sorn::SORN_DATA_TYPE_KNOWN_DICT) {
-            *static_cast<ref<SornObject>*>(member) = sornschema::Success::Factory(pool);
+            if (fMulti) {
+                for (int i = 0; i < 3; ++i) EXPECT_TRUE(static_cast<RoxStringArray*>(member)->Add(text));
+            } else {
+                *static_cast<RoxString*>(member) = text;
+            }
+            ++filled.nBlocks;
+        } else if (fMulti) {
+            for (int i = 0; i < 3; ++i) EXPECT_TRUE(static_cast<RoxGenericArray*>(member)->Add(child));
+            filled.nReferences += 3;
+            ++filled.nBlocks;
+        } else {
+            *static_cast<RefBase*>(member) = RefBase(child);
+            ++filled.nReferences;
         }
     }
+    return filled;
 }
 
 TEST(FactoryTest, AFilledObjectGivesEverythingBack) {
+    unsigned nReferences = 0;
     for (uint32_t id : StructIds()) {
         const StructInfo& info = *Schema::vStructDefG[id];
         RoxMempool pool("FactoryTest");
+        const ref<SornObject> child = sornschema::Success::Factory(&pool);
         const size_t before = pool.GetUsedBytes();
         {
             const ref<SornObject> object = info.Factory(&pool);
-            Fill(info, *object, &pool);
-            EXPECT_GT(pool.GetUsedBytes(), before) << info.name;
+            const size_t empty = pool.GetUsedBytes();
+            const Filled filled = Fill(info, *object, child.get(), &pool);
+            EXPECT_EQ(child->GetRefCount(), 1 + filled.nReferences) << info.name;
+            if (filled.nBlocks == 0) {
+                EXPECT_EQ(pool.GetUsedBytes(), empty) << info.name;
+            } else {
+                EXPECT_GT(pool.GetUsedBytes(), empty) << info.name;
+            }
+            nReferences += filled.nReferences;
         }
+        EXPECT_EQ(child->GetRefCount(), 1u) << info.name;
         EXPECT_EQ(pool.GetUsedBytes(), before) << info.name;
     }
+    EXPECT_GT(nReferences, 0u);
 }
 
 TEST(FactoryTest, GeneralHeap) {

@@ -66,7 +66,11 @@ FIELD_MESSAGES = (
     ("9 a s32 optional", 'slot 9 of "a" is not from 1 to 8'),
     ("1 Alpha s32 optional", 'the name "Alpha" is not lower camel case'),
     ("1 al_pha s32 optional", 'the name "al_pha" is not lower camel case'),
-    ("1 structId s32 optional", 'the field name "structId" is a member of every record'),
+    *((f"1 {name} s32 optional", f'the field name "{name}" is a member of every record')
+      for name in ("structId", "pMempoolM", "countM", "classTagG", "structIdG", "structInfoG", "vFieldInfoG",
+                   "vFieldInfoHistoryG", "pFieldNamesG")),
+    *((f"1 {name} s32 optional", f'the field name "{name}" has a meaning in generated code')
+      for name in ("ref", "assert", "errno", "linux", "offsetof", "stderr", "stdin", "stdout", "unix")),
     ("1 a s32 colour optional", 'the type "s32" takes no reference, but has "colour"'),
     ("1 a enum optional", 'the type "enum" needs the name of its enum'),
     ("1 a object optional", 'the type "object" needs the name of its struct'),
@@ -96,13 +100,14 @@ SECOND_FIELD_MESSAGES = (
 # What replaces ENUM, the line counted from its first, and what is said.
 ENUM_MESSAGES = (
     ("values = '''\n1 red\n3 blue\n'''", 6, 'value 3 of "colour" is not below its count 3'),
-    ("values = '''\n1 red\n1 blue\n'''", 6, "value 1 is taken at test.toml:10"),
+    ("values = '''\n2 red\n2 blue\n'''", 6, "value 2 is taken at test.toml:10"),
     ("values = '''\n2 red\n1 blue\n'''", 6, "value 1 stands behind value 2"),
     ("values = '''\n1 red\n2 red\n'''", 6, 'the value name "red" is taken at test.toml:10'),
     ("values = '''\n1 a-b\n2 a_b\n'''", 6, '"a_b" and "a-b" give the same C++ name'),
     ("values = '''\n1 red\n2 re\"d\n'''", 6, 'the value name "re"d" may have letters, digits, "_", "." and "-" only'),
     ("values = '''\n1 red\nx blue\n'''", 6, "a value reads: number, name"),
     ("values = '''\n1 red\n2 light blue\n'''", 6, "a value reads: number, name"),
+    ("values = '''\n1 red\n'''", 1, 'the count 3 of "colour" is not its highest value 1 + 1'),
     ("values = '1 red'", 4, "\"values\" of [enum.colour] must be written between ''' and '''"),
     ("open = true\nvalues = '''\n1 red\n'''", 1, '"colour" is open and lists values all the same'),
     ("", 1, '"colour" has no values and is not open'),
@@ -155,6 +160,8 @@ class MessageTest(WithFolder):
             ("[struct.one]\nid = 1\nslots = 1\n" + ENUM.replace("20", "1"), 9,
              'id 1 of "colour" is taken by "one" at test.toml:6'),
             ("[struct.colour]\nid = 1\nslots = 1\n" + ENUM, 9, 'the name "colour" is taken at test.toml:6'),
+            ("[struct.one]\nid = 1\nslots = 1\nprefix = 'vuka:on.'\n[struct.two]\nid = 2\nslots = 1\nprefix = 'vuka:on.'\n", 10,
+             'the prefix "vuka:on." of "two" is that of "one" at test.toml:6'),
             ("[struct]\none = 1\n", 7, "[struct] holds only tables such as [struct.name]"),
             ("[record.one]\nid = 1\n", 1, 'unknown table or key "record"'),
             ("[record]\nid = 1\n", 6, 'unknown table or key "record"'),
@@ -172,6 +179,15 @@ class MessageTest(WithFolder):
         path = self.write(SETTINGS + "[struct.one]\nid = 1\nslots = 1\n[struct.One]\nid = 2\nslots = 1\n")
         self.assertEqual(self.problems(path), ['test.toml:9: the name "One" is not lower camel case',
                                                'test.toml:9: "One" and "one" give the same class name'])
+
+        path = self.write(SETTINGS + "[struct.Colour]\nid = 1\nslots = 1\n" + ENUM)
+        self.assertEqual(self.problems(path), ['test.toml:6: the name "Colour" is not lower camel case',
+                                               'test.toml:9: "colour" and "Colour" give the same class name'])
+        for name in sorted(layout.RESERVED_CLASSES):
+            lower = name[0].lower() + name[1:]
+            for text in (f"[struct.{lower}]\nid = 1\nslots = 1\n", ENUM.replace("colour", lower)):
+                self.assertEqual(self.problems(self.write(SETTINGS + text)), [
+                    f'test.toml:6: the class name "{name}" of "{lower}" has a meaning in generated code'])
 
     def test_rows_per_id(self):
         rows = "[enum.types]\nid = 30\ncount = 31\nrowPerId = true\nvalues = '''\n1 one\n2 other\n'''\n"
@@ -352,6 +368,16 @@ class OutputTest(WithFolder):
             text = f.read()
         for line in ("enum Mode : uint32_t {", "    Mode_12a = 1,", "    Mode_a_b = 2,", "    Mode_new = 3,"):
             self.assertIn(line + "\n", text)
+
+    def test_variables_of_enumerations_do_not_collide(self):
+        values = "values = '''\n0 red\n'''\n"
+        self.generate(self.write(SETTINGS + "".join(
+            f"[enum.{name}]\nid = {identity}\ncount = 1\n{values}" for identity, name in enumerate(
+                ("x", "vX", "xDef", "vXDef", "names", "none", "enum"), 1))))
+        with open(os.path.join(self.folder.name, "out", "sornschema", "Enums.cpp"), encoding="utf-8") as f:
+            names = re.findall(r"^constinit const .*?(\w+)(?:\[\d+\])? = ", f.read().split("namespace sorn")[0], re.M)
+        self.assertEqual(len(names), 2 * 7)
+        self.assertEqual(len(set(names)), 2 * 7)
 
     def test_real_catalogue_from_the_shell(self):
         files = sorted(os.path.join(CATALOGUE, f) for f in os.listdir(CATALOGUE))
