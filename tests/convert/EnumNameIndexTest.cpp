@@ -118,7 +118,7 @@ TEST_F(EnumNameIndexTest, ManyThreadsAskFirst) {
     for (int i = 0; i < 5; ++i) {
         EnumNameIndex::DestroyAll();
         std::vector<std::thread> vThread;
-        for (int j = 0; j < 8; ++j) vThread.emplace_back(FindAllNames);
+        for (int j = 0; j < 8; ++j) vThread.emplace_back([] { FindAllNames(); });
         for (std::thread& thread : vThread) thread.join();
     }
 }
