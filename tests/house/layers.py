@@ -17,8 +17,8 @@ class Layer(NamedTuple):
 
 
 PLATFORM = ("rox", "kelbaselib")
-LIBRARY = PLATFORM + ("model", "sornschema", "dict", "json", "convert", "lazy")
-TESTS_OF_LIBRARY = ("model", "schema", "dict", "json", "convert", "lazy")
+LIBRARY = PLATFORM + ("model", "sornschema", "dict", "json", "convert", "binary", "typedjson", "lazy")
+TESTS_OF_LIBRARY = ("model", "schema", "dict", "json", "convert", "binary", "typedjson", "lazy", "pairs")
 
 # A layer stands behind all layers that it may include.
 LAYERS = {
@@ -30,7 +30,11 @@ LAYERS = {
     "dict": Layer(f"{SORN}/dict", "sorn/dict", PLATFORM + ("model",)),
     "json": Layer(f"{SORN}/json", "sorn/json", PLATFORM + ("model", "dict")),
     "convert": Layer(f"{SORN}/convert", "sorn/convert", PLATFORM + ("model", "dict")),
-    "lazy": Layer(f"{SORN}/lazy", "sorn/lazy", PLATFORM + ("model", "sornschema", "dict", "json", "convert")),
+    "binary": Layer(f"{SORN}/binary", "sorn/binary", PLATFORM + ("model", "dict", "convert")),
+    "typedjson": Layer(f"{SORN}/typedjson", "sorn/typedjson", PLATFORM + ("model", "dict", "json", "convert")),
+    "lazy": Layer(
+        f"{SORN}/lazy", "sorn/lazy", PLATFORM + ("model", "sornschema", "dict", "json", "convert", "binary", "typedjson")
+    ),
     "sorn": Layer(SORN, "sorn", LIBRARY),  # sorn.h, the header of all
     "tools": Layer("tools", "tools", LIBRARY + ("sorn",)),
     "bench": Layer("bench", "bench", LIBRARY + ("sorn",)),
@@ -55,7 +59,7 @@ LAYERS = {
 # header names the class, by a forward declaration; records hold references on it, too.
 KNOT = f"{SORN}/dict/LazyBody.h"
 KNOT_CLASS = "LazyDict"
-KNOT_FREE = ("dict", "json", "convert")
+KNOT_FREE = ("dict", "json", "convert", "binary", "typedjson")
 
 SUFFIXES = (".h", ".cpp", ".cc", ".hpp", ".inc")
 INCLUDE = re.compile(r'^\s*#\s*include\s*([<"])([^">]+)[">]', re.MULTILINE)

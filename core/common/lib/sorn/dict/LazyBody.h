@@ -5,6 +5,9 @@
 
 class RoxMempool;
 
+namespace kelbaselib {
+class Bytesource;
+}
 namespace rox {
 class ByteBuffer;
 }
@@ -17,6 +20,15 @@ namespace sorn {
 class Dict;
 class Dictionary;
 class LazyDict;
+class SornObject;
+
+/// What a body's JSON text is made of: at most one member is set. None: the body writes nothing.
+struct LazyBodyContent {
+    ref<Dictionary> dictionary;  ///< the text is the one of this dictionary
+    ref<rox::ByteBuffer> text;   ///< these bytes are the text
+    ref<SornObject> object;      ///< the text is the typed writer's one of this object at `version`
+    OrvoVersion version;
+};
 
 /// LazyDict::FromDictionary.
 ref<LazyDict> NewLazyBody(RoxMempool* pool, const ref<Dictionary>& dictionary, OrvoVersion version);
@@ -27,6 +39,14 @@ ref<Dict> DictOfLazyBody(RoxMempool* pool, const ref<LazyDict>& body);
 /// LazyDict::operator==; null equals only null.
 bool FEqualLazyBodies(const ref<LazyDict>& a, const ref<LazyDict>& b);
 /// LazyDict::ToWrite; the body is not null.
-ref<Dictionary> LazyBodyToWrite(const ref<LazyDict>& body, bool pretty, ref<rox::ByteBuffer>& text);
+LazyBodyContent LazyBodyToWrite(const ref<LazyDict>& body, bool pretty);
+/// LazyDict::FromBytestring without a version; null for no bytes, and for bytes that open with 0.
+ref<LazyDict> NewLazyBodyOfBytes(RoxMempool* pool, const ref<rox::ByteBuffer>& bytes);
+/// LazyDict::FromBytesource without a version: takes the source's ownership.
+ref<LazyDict> NewLazyBodyOfSource(RoxMempool* pool, kelbaselib::Bytesource* source);
+/// A reference on a body, for those to whom the class is incomplete.
+ref<LazyDict> ShareLazyBody(const LazyDict* body);
+/// LazyDict::ToSornObjectOrError; the body is not null.
+ref<SornObject> ObjectOfLazyBody(const ref<LazyDict>& body);
 
 }  // namespace sorn

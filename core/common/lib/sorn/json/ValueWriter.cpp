@@ -68,8 +68,7 @@ bool ValueWriter::BeginNullOrLazy(const DictValue& value) {
         outM.Literal("null");
         return true;
     }
-    ref<rox::ByteBuffer> text;
-    const ref<Dictionary> dictionary = LazyBodyToWrite(lazy->GetValue(), formatM.isPretty, text);
+    const auto [dictionary, text, object, version] = LazyBodyToWrite(lazy->GetValue(), formatM.isPretty);
     if (dictionary == nullptr) {
         if (text != nullptr) outM.Bytes(text->GetData(), text->GetLength());
         return true;

@@ -4,6 +4,7 @@
 #include "sorn/dict/Dictionary.h"
 #include "sorn/dict/RoxByteBuffer.h"
 #include "sorn/lazy/LazyDict.h"
+#include "sorn/model/SornObject.h"
 
 namespace sorn {
 
@@ -24,8 +25,24 @@ bool FEqualLazyBodies(const ref<LazyDict>& a, const ref<LazyDict>& b) {
     return *a == *b;
 }
 
-ref<Dictionary> LazyBodyToWrite(const ref<LazyDict>& body, bool pretty, ref<rox::ByteBuffer>& text) {
-    return body->ToWrite(pretty, text);
+LazyBodyContent LazyBodyToWrite(const ref<LazyDict>& body, bool pretty) {
+    return body->ToWrite(pretty);
+}
+
+ref<LazyDict> NewLazyBodyOfBytes(RoxMempool* pool, const ref<rox::ByteBuffer>& bytes) {
+    return LazyDict::FromBytestring(pool, bytes, 0);
+}
+
+ref<LazyDict> NewLazyBodyOfSource(RoxMempool* pool, kelbaselib::Bytesource* source) {
+    return LazyDict::FromBytesource(pool, source, 0);
+}
+
+ref<LazyDict> ShareLazyBody(const LazyDict* body) {
+    return const_cast<LazyDict*>(body);
+}
+
+ref<SornObject> ObjectOfLazyBody(const ref<LazyDict>& body) {
+    return body->ToSornObjectOrError();
 }
 
 }  // namespace sorn

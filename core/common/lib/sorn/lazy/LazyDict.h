@@ -3,6 +3,7 @@
 #include "rox/RoxCore.h"
 #include "rox/RoxString.h"
 #include "rox/ref.h"
+#include "sorn/dict/LazyBody.h"
 #include "sorn/model/OrvoVersion.h"
 
 namespace kelbaselib {
@@ -15,9 +16,6 @@ class ByteBuffer;
 namespace sorn {
 
 class ByteBuffer;
-class Dict;
-class Dictionary;
-class SornObject;
 
 /// A message body in the shape in which it came, shared by reference. Which member holds it is told by
 /// GetRep; nothing is cached: every conversion works anew. All results are made in the pool that the body was
@@ -61,18 +59,20 @@ class LazyDict final : public RoxCore {
     /// Replaces the dictionary and does not touch the representation.
     void SetDictionary(const ref<Dictionary>& dictionary);
 
-    // What dynamic values ask of a body. Objects go by way of their dictionary; bodies of the binary form and
-    // of streams are answered as unreadable ones.
+    // Conversions.
 
     /// The body as a Dict, never null: a failure gives a dictionary of type "error" with "code" and "text".
     ref<Dict> ToDict() const;
     /// The body as a dictionary, or null and words, which replace what `error` holds. The one of a REP_DICT
     /// or REP_DICTIONARY body is shared, not copied.
     ref<Dictionary> ToDictionary(RoxString& error) const;
-    /// What the body's JSON text is made of, for writers that walk dictionaries without recursion: a
-    /// dictionary, or null and the text itself in `text`, or, of an unreadable body, null and a null
-    /// reference.
-    ref<Dictionary> ToWrite(bool pretty, ref<rox::ByteBuffer>& text) const;
+    /// The body as an object, or null and words; an empty `error` is to be handed in, for some words are
+    /// appended. A REP_OBJECT body is shared, not copied.
+    ref<SornObject> ToSornObjectOrErrorString(RoxString& error) const;
+    /// The same, with an object of type "error" for the words in place of null.
+    ref<SornObject> ToSornObjectOrError() const;
+    /// What the body's JSON text is made of, for writers that walk values without recursion.
+    LazyBodyContent ToWrite(bool pretty) const;
     /// Appends the body's JSON text. JSON bytes go out as they are unless `pretty`; an unreadable body writes
     /// nothing.
     void ToJsonByteBuffer(ByteBuffer& out, bool pretty) const;
@@ -95,6 +95,7 @@ class LazyDict final : public RoxCore {
     LazyDict(RoxMempool* pool, Rep rep, OrvoVersion version) : RoxCore(pool), repM(rep), versionM(version) {}
 
     ref<Dictionary> NewErrorDictionary(const char* code, const RoxString& text) const;
+    ref<SornObject> NewErrorObject(const RoxString& text) const;
 
     Rep repM;
     ref<Dict> dictM;

@@ -50,23 +50,39 @@ ref<Dict> LazyDict::ToDict() const {
     return MempoolNew<Dict>(GetMempool(), dictionary);
 }
 
-ref<Dictionary> LazyDict::ToWrite(bool pretty, ref<rox::ByteBuffer>& text) const {
-    text = nullptr;
+ref<SornObject> LazyDict::ToSornObjectOrErrorString(RoxString& error) const {
+    if (repM == REP_OBJECT) return objectM;
+    ref<SornObject> object;
+    const ref<Dictionary> dictionary = ToDictionary(error);
+    if (dictionary == nullptr) return nullptr;
+    DictionarySornObject(GetMempool(), Schema::vStructDefG, Schema::nStructDefG)
+        .DictionaryToSornObject(dictionary, versionM, object, error);
+    return object;
+}
+
+ref<SornObject> LazyDict::ToSornObjectOrError() const {
+    RoxString error;
+    ref<SornObject> object = ToSornObjectOrErrorString(error);
+    return object != nullptr ? object : NewErrorObject(error);
+}
+
+LazyBodyContent LazyDict::ToWrite(bool pretty) const {
+    LazyBodyContent content;
     if (repM == REP_JSON && !pretty) {
-        text = bytesM;
-        return nullptr;
+        content.text = bytesM;
+    } else {
+        RoxString error;  // goes nowhere
+        content.dictionary = ToDictionary(error);
     }
-    RoxString error;  // goes nowhere
-    return ToDictionary(error);
+    return content;
 }
 
 void LazyDict::ToJsonByteBuffer(ByteBuffer& out, bool pretty) const {
-    ref<rox::ByteBuffer> text;
-    const ref<Dictionary> dictionary = ToWrite(pretty, text);
-    if (dictionary != nullptr) {
-        dictionary->ToJson(out, JsonFormat(pretty));
-    } else if (text != nullptr) {
-        out.AppendBytes(text->GetData(), text->GetLength());
+    const LazyBodyContent content = ToWrite(pretty);
+    if (content.dictionary != nullptr) {
+        content.dictionary->ToJson(out, JsonFormat(pretty));
+    } else if (content.text != nullptr) {
+        out.AppendBytes(content.text->GetData(), content.text->GetLength());
     }
 }
 
@@ -79,6 +95,14 @@ ref<Dictionary> LazyDict::NewErrorDictionary(const char* code, const RoxString& 
     dictionary->Add(*InternedString(nullptr, "code"), RoxString(GetMempool(), code));
     dictionary->Add(*InternedString(nullptr, "text"), text);
     return dictionary;
+}
+
+ref<SornObject> LazyDict::NewErrorObject(const RoxString& text) const {
+    ref<SornObject> object;
+    RoxString none;  // the error dictionary fits its struct
+    DictionarySornObject(GetMempool(), Schema::vStructDefG, Schema::nStructDefG)
+        .DictionaryToSornObject(NewErrorDictionary("badArgument", text), 0, object, none);
+    return object;
 }
 
 }  // namespace sorn

@@ -1,0 +1,1 @@
+#include "sorn/binary/GoogleInt.h"

@@ -1,0 +1,1 @@
+#include "sorn/typedjson/JsonSornObject.h"
