@@ -180,7 +180,7 @@ Strings HardNames(unsigned n) {
 }
 
 TEST_F(DictionaryTest, SortedNamesAreInByteOrder) {
-    for (const unsigned n : {1u, 2u, 3u, 10u, 31u, 32u, 33u, 34u, 100u, 1000u}) {
+    for (const unsigned n : {1u, 2u, 3u, 10u, 31u, 32u, 33u, 34u, 100u, 1000u, 1023u, 1024u, 1025u, 5000u}) {
         Strings names = HardNames(n);
         const ref<Dictionary> dictionary = Make();
         for (const std::string& name : names) dictionary->Add(Text(name), Text("v"));
@@ -209,6 +209,23 @@ TEST_F(DictionaryTest, NamesWithNulBytesSort) {
     const ref<Dictionary> dictionary = Make();
     for (auto name = names.rbegin(); name != names.rend(); ++name) dictionary->Add(Text(*name), Text("v"));
     EXPECT_EQ(Names(dictionary), names);
+}
+
+TEST_F(DictionaryTest, ThousandsOfNamesWithNulBytesAndCommonBeginningsSort) {
+    // Bytes that end a name, fill up a name and follow it are one here: zeros at every place of eight.
+    std::set<std::string> names;
+    for (const char* beginning : {"", "eight by", "sixteen bytes ar", "twelve bytes"}) {
+        for (unsigned i = 0; i < 3000; ++i) {
+            std::string name = beginning;
+            for (unsigned rest = i; rest != 0; rest /= 3) name.push_back("\0\x01\xff"[rest % 3]);
+            names.insert(name);
+        }
+    }
+    ASSERT_GT(names.size(), 10'000u);
+    const ref<Dictionary> dictionary = Make();
+    for (auto name = names.rbegin(); name != names.rend(); ++name) dictionary->Add(Text(*name), Text("v"));
+    // std::string compares bytes as unsigned ones, and a shorter name comes first.
+    EXPECT_EQ(Names(dictionary), Strings(names.begin(), names.end()));
 }
 
 TEST_F(DictionaryTest, MoreNamesThanAnArrayHolds) {
