@@ -10,6 +10,7 @@ sys.dont_write_bytecode = True
 import check
 import emit_class
 import emit_definitions
+import emit_proto
 import emit_tables
 import output
 import parse
@@ -44,15 +45,28 @@ def outputs(catalogue, namespace, version):
     return files
 
 
+def write_proto(catalogue, path, is_oneof):
+    package = os.path.splitext(os.path.basename(path))[0]
+    text = output.header(output.generator_version(), "the catalogue") + emit_proto.emit(catalogue, package, is_oneof)
+    output.write_if_changed(path, text)
+    output.touch(path)
+    return 0
+
+
 def main(arguments):
     parser = argparse.ArgumentParser(description=__doc__)
-    parser.add_argument("--out", required=True, metavar="DIR", help="output goes to DIR/NAMESPACE/")
+    target = parser.add_mutually_exclusive_group(required=True)
+    target.add_argument("--out", metavar="DIR", help="output goes to DIR/NAMESPACE/")
+    target.add_argument("--proto", metavar="FILE", help="write only the schema as a proto2 file, for tests against a peer")
+    parser.add_argument("--oneof", action="store_true", help="with --proto: the fields of known dicts stand in a oneof")
     parser.add_argument("--namespace", default="sornschema", help="of the classes (default: sornschema)")
     parser.add_argument("--list-outputs", action="store_true", help="print the output paths and write nothing")
     parser.add_argument("files", nargs="+", metavar="FILE", help="catalogue files (TOML)")
     options = parser.parse_args(arguments)
     try:
         catalogue = load(options.files)
+        if options.proto:
+            return write_proto(catalogue, options.proto, options.oneof)
     except CatalogueError as error:
         print(error, file=sys.stderr)
         return 1

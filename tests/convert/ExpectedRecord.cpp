@@ -148,6 +148,10 @@ std::string Print(const Entries& entries) {
     return out + "}";
 }
 
+/// The typed text of an object without sub-objects, as a body writes it: fields in the order of slots, and
+/// "type" in front of the last one that sorts below it.
+std::string TypedJson(const SornObject& object);
+
 std::string AnyDict(Dict& dict) {
     Entries entries;
     RoxStringArray names;
@@ -174,7 +178,7 @@ std::string Reference(const FieldInfo& field, RoxCore* core, int version) {
         case 6:
             return AnyDict(static_cast<Dict&>(*core));
         case 13:
-            return ExpectedJson(*static_cast<LazyDict&>(*core).GetStoredObject(), 0);
+            return TypedJson(*static_cast<LazyDict&>(*core).GetStoredObject());
         default:
             return ExpectedJson(static_cast<SornObject&>(*core), version);
     }
@@ -236,6 +240,33 @@ const FieldInfo* Record(const StructInfo& info, int slot, int version) {
     return version < record->firstVersion || version > record->lastVersion ? nullptr : record;
 }
 
+bool FSet(const SornObject& object, const FieldInfo& field) {
+    const char* start = reinterpret_cast<const char*>(&object);
+    return field.arity != 0 || field.presenceOffset == 0 || start[field.presenceOffset] != 0;
+}
+
+std::string TypedJson(const SornObject& object) {
+    const StructInfo& info = *Schema::FindStruct(object.structId);
+    int anchor = info.nFields;
+    for (int slot = 0; slot < info.nFields; ++slot) {
+        const FieldInfo* field = Record(info, slot, 0);
+        if (field != nullptr && strcmp(info.FieldName(*field), "type") < 0) anchor = slot;
+    }
+    std::string out;
+    for (int slot = 0; slot <= info.nFields; ++slot) {
+        if (slot == anchor) out += std::string(out.empty() ? "" : ", ") + "\"type\": " + Quoted(info.name);
+        const FieldInfo* field = slot < info.nFields ? Record(info, slot, 0) : nullptr;
+        if (field == nullptr || !FSet(object, *field)) continue;
+        std::string printed;
+        for (const std::string& value : Values(object, *field, 0))
+            printed += (printed.empty() ? "" : ",") + value;
+        if (printed.empty()) continue;
+        if (field->arity == 2) printed = "[" + printed + "]";
+        out += std::string(out.empty() ? "" : ", ") + Quoted(info.FieldName(*field)) + ": " + printed;
+    }
+    return "{" + out + "}";
+}
+
 }  // namespace
 
 std::string ExpectedJson(const SornObject& object, int version) {
@@ -245,8 +276,7 @@ std::string ExpectedJson(const SornObject& object, int version) {
     for (int slot = 0; slot < info.nFields; ++slot) {
         const FieldInfo* field = Record(info, slot, version);
         if (field == nullptr) continue;
-        const char* start = reinterpret_cast<const char*>(&object);
-        if (field->arity == 0 && field->presenceOffset != 0 && start[field->presenceOffset] == 0) continue;
+        if (!FSet(object, *field)) continue;
         std::vector<std::string> values = Values(object, *field, version);
         if (values.empty()) continue;
         if (field->arity == 2 && field->dataType != 13) {

@@ -18,7 +18,7 @@ class Layer(NamedTuple):
 
 PLATFORM = ("rox", "kelbaselib")
 LIBRARY = PLATFORM + ("model", "sornschema", "dict", "json", "convert", "binary", "typedjson", "lazy")
-TESTS_OF_LIBRARY = ("model", "schema", "dict", "json", "convert", "binary", "typedjson", "lazy", "pairs")
+TESTS_OF_LIBRARY = ("model", "schema", "dict", "json", "convert", "binary", "typedjson", "lazy", "pairs", "peer")
 
 # A layer stands behind all layers that it may include.
 LAYERS = {
@@ -38,7 +38,13 @@ LAYERS = {
     "sorn": Layer(SORN, "sorn", LIBRARY),  # sorn.h, the header of all
     "tools": Layer("tools", "tools", LIBRARY + ("sorn",)),
     "bench": Layer("bench", "bench", LIBRARY + ("sorn",)),
-    "bench/text": Layer("bench/text", "text", LIBRARY + ("sorn", "bench")),
+    "bench/common": Layer("bench/common", "common", ()),
+    **{
+        f"bench/{name}": Layer(f"bench/{name}", name, LIBRARY + ("sorn", "bench/common"))
+        for name in ("text", "codecs", "instructions")
+    },
+    "fuzz/support": Layer("fuzz/support", "fuzz/support", LIBRARY + ("sorn",)),
+    "fuzz": Layer("fuzz", "fuzz", LIBRARY + ("sorn", "fuzz/support")),
     "examples": Layer("examples", "examples", LIBRARY + ("sorn",)),
     "tests/support": Layer("tests/support", "support", ()),
     # The tests of a platform library stand without the rest; those of libsorn.so link all of it, and may use fixtures of

@@ -4,7 +4,7 @@
 #include <string>
 
 #include "convert/ConvertFixture.h"
-#include "kelbaselib/Bytesource.h"
+#include "lazy/TextSource.h"
 #include "rox/VkCast.h"
 #include "sorn/dict/ByteBuffer.h"
 #include "sorn/dict/Dict.h"
@@ -19,33 +19,6 @@ namespace sorntest {
 
 using namespace sorn;
 using sornschema::EveryTypeCompanion;
-
-/// A source that counts what is done to it.
-class CountingSource final : public kelbaselib::Bytesource {
- public:
-    struct Counts {
-        int reads = 0;
-        int newSources = 0;
-        int releases = 0;
-    };
-    explicit CountingSource(Counts& counts) : countsM(counts) {}
-    unsigned Read(void*, unsigned) override {
-        ++countsM.reads;
-        return 0;
-    }
-    Bytesource* NewSource() override {
-        ++countsM.newSources;
-        return new CountingSource(countsM);
-    }
-    unsigned GetAvailable() const override { return 0; }
-    void Release() override {
-        ++countsM.releases;
-        delete this;
-    }
-
- private:
-    Counts& countsM;
-};
 
 class LazyDictTest : public ConvertFixture {
  protected:
@@ -145,9 +118,9 @@ TEST_F(LazyDictTest, SetDictionaryLeavesTheRepresentation) {
 }
 
 TEST_F(LazyDictTest, TheSourceIsReleasedOnceAndNotReadBefore) {
-    CountingSource::Counts counts;
+    TextSource::Counts counts;
     {
-        ref<LazyDict> lazy = LazyDict::FromBytesource(&pool, new CountingSource(counts), 42);
+        ref<LazyDict> lazy = LazyDict::FromBytesource(&pool, new TextSource(counts, ""), 42);
         EXPECT_EQ(lazy->GetRep(), LazyDict::REP_BYTESOURCE);
         EXPECT_NE(lazy->GetStoredBytesource(), nullptr);
         ref<LazyDict> another = lazy;
@@ -162,8 +135,8 @@ TEST_F(LazyDictTest, NewTakesItsMembersAndTheVersion) {
     const ref<Dict> dict = MakeDict(&pool);
     const ref<rox::ByteBuffer> bytes = Bytes("{}", 2);
     const ref<SornObject> object = EveryTypeCompanion::Factory(&pool);
-    CountingSource::Counts counts;
-    CountingSource* const source = new CountingSource(counts);
+    TextSource::Counts counts;
+    TextSource* const source = new TextSource(counts, "");
     {
         const ref<LazyDict> lazy =
             LazyDict::New(&pool, LazyDict::REP_OBJECT, dict, bytes, object, source, 17);
@@ -186,7 +159,8 @@ TEST_F(LazyDictTest, ABodyWithoutItsSource) {
     const ref<LazyDict> lazy = LazyDict::FromBytesource(&pool, nullptr, 3);
     EXPECT_EQ(lazy->GetRep(), LazyDict::REP_BYTESOURCE);
     EXPECT_EQ(lazy->GetStoredBytesource(), nullptr);
-    EXPECT_EQ(WordsOf(lazy), "byte source was not read");
+    EXPECT_EQ(WordsOf(lazy), "");
+    EXPECT_EQ(DictOf(lazy), R"({"code": "badArgument", "text": "", "type": "error"})");
     EXPECT_EQ(JsonOf(lazy, false), "before ");
 }
 
@@ -243,19 +217,31 @@ TEST_F(LazyDictTest, BadJsonBecomesAnErrorDictionaryOrWords) {
     EXPECT_EQ(JsonOf(lazy, true), "before ");
 }
 
-TEST_F(LazyDictTest, BodiesThatAreNotRead) {
-    ref<LazyDict> binary = LazyDict::FromBytestring(&pool, Bytes("\x02", 1), 0);
-    EXPECT_EQ(WordsOf(binary), "protobuf did not unmarshal");
-    EXPECT_EQ(DictOf(binary),
-              R"({"code": "badArgument", "text": "protobuf did not unmarshal", "type": "error"})");
-    EXPECT_EQ(JsonOf(binary, false), "before ");
-    CountingSource::Counts counts;
-    ref<LazyDict> stream = LazyDict::FromBytesource(&pool, new CountingSource(counts), 0);
-    EXPECT_EQ(WordsOf(stream), "byte source was not read");
-    EXPECT_EQ(DictOf(stream),
-              R"({"code": "badArgument", "text": "byte source was not read", "type": "error"})");
+TEST_F(LazyDictTest, ABinaryBodyThatDoesNotUnmarshal) {
+    // Struct id 0 names nothing. The body is an error object then, in every form.
+    const ref<LazyDict> binary = LazyDict::FromBytestring(&pool, Bytes("\x02", 1), 0);
+    const char* const sorted =
+        R"({"code": "badArgument", "text": "protobuf did not unmarshal", "type": "error"})";
+    EXPECT_EQ(DictOf(binary), sorted);
+    RoxString error;
+    EXPECT_EQ(Text(binary->ToDictionary(error)->ToJson(false)), sorted);
+    EXPECT_EQ(Text(error), "");
+    EXPECT_EQ(JsonOf(binary, false), std::string("before ") + sorted);  // here the slots have this order, too
+    EXPECT_EQ(binary->ToProtobuf(), binary->GetStoredBytes());
+}
+
+TEST_F(LazyDictTest, AStreamThatCannotBeRead) {
+    TextSource::Counts counts;
+    const ref<LazyDict> stream = LazyDict::FromBytesource(&pool, new TextSource(counts, "{\"a\":1"), 0);
+    EXPECT_EQ(WordsOf(stream), "");
+    const ref<Dict> dict = stream->ToDict();
+    EXPECT_EQ(Text(dict->GetString("type", 0)), "error");
+    EXPECT_EQ(Text(dict->GetString("code", 0)), "badArgument");
+    EXPECT_NE(Text(dict->GetString("text", 0)), "");
     EXPECT_EQ(JsonOf(stream, true), "before ");
+    EXPECT_EQ(JsonOf(stream, false), "before ");
     EXPECT_EQ(stream->GetRep(), LazyDict::REP_BYTESOURCE);
+    EXPECT_EQ(counts.newSources, counts.releases);
 }
 
 TEST_F(LazyDictTest, AnUnknownRepresentation) {
@@ -264,15 +250,32 @@ TEST_F(LazyDictTest, AnUnknownRepresentation) {
     EXPECT_EQ(WordsOf(lazy), "LazyDict to Dictionary: unknown representation in LazyDict");
     EXPECT_EQ(DictOf(lazy), R"({"code": "internalError", "text": "bad rep in LazyDict", "type": "error"})");
     EXPECT_EQ(JsonOf(lazy, false), "before ");
+    EXPECT_EQ(JsonOf(lazy, true), "before ");
+    EXPECT_TRUE(lazy->ToProtobuf()->FEmpty());
+    RoxString error("old;");
+    EXPECT_EQ(lazy->ToSornObjectOrErrorString(error), nullptr);
+    EXPECT_EQ(Text(error), "unknown rep in LazyDict");
+    unsigned structId = 1;
+    RoxString name("old");
+    EXPECT_FALSE(lazy->GetType(&structId));
+    EXPECT_FALSE(lazy->GetTypeName(&name));
+    EXPECT_EQ(structId, 1u);
+    EXPECT_EQ(Text(name), "old");
 }
 
 TEST_F(LazyDictTest, BodiesWithoutTheirMember) {
-    for (LazyDict::Rep rep :
-         {LazyDict::REP_DICT, LazyDict::REP_JSON, LazyDict::REP_OBJECT, LazyDict::REP_DICTIONARY}) {
+    for (LazyDict::Rep rep : {LazyDict::REP_DICT, LazyDict::REP_JSON, LazyDict::REP_PROTOBUF,
+                              LazyDict::REP_OBJECT, LazyDict::REP_DICTIONARY, LazyDict::REP_BYTESOURCE}) {
         ref<LazyDict> lazy = LazyDict::New(&pool, rep, nullptr, nullptr, nullptr, nullptr, 0);
         EXPECT_EQ(WordsOf(lazy), "");
         EXPECT_EQ(Text(lazy->ToDict()->GetString("type", 0)), "error");
         EXPECT_EQ(JsonOf(lazy, false), "before ");
+        RoxString error;
+        EXPECT_EQ(lazy->ToSornObjectOrErrorString(error), nullptr);
+        EXPECT_FALSE(lazy->ToProtobuf()->FEmpty());  // an error object
+        unsigned structId = 0;
+        EXPECT_FALSE(lazy->GetType(&structId));
+        EXPECT_TRUE(lazy->ToJsonBytestring(false)->FEmpty());
     }
 }
 
@@ -289,7 +292,8 @@ TEST_F(LazyDictTest, Json) {
     EXPECT_EQ(JsonOf(dict, false), R"(before {"a": "x", "b": 1})");
     ref<LazyDict> object =
         LazyDict::FromSornObject(&pool, Object(R"({"type": "everyTypeCompanion", "number": 5})"), 0);
-    EXPECT_EQ(JsonOf(object, false), R"(before {"number": 5, "type": "everyTypeCompanion"})");
+    // In the order of slots, "type" before the last name below it: here "number".
+    EXPECT_EQ(JsonOf(object, false), R"(before {"type": "everyTypeCompanion", "number": 5})");
     EXPECT_EQ(JsonOf(object, true), "before {\n    \"number\": 5, \n    \"type\": \"everyTypeCompanion\"\n}");
 }
 
@@ -319,12 +323,12 @@ TEST_F(LazyDictTest, WhatDynamicValuesAskOfABody) {
     EXPECT_FALSE(FEqualLazyBodies(none, text));
     EXPECT_FALSE(FEqualLazyBodies(text, none));
     EXPECT_TRUE(FEqualLazyBodies(text, FromText(R"({"a":1})")));
-    EXPECT_EQ(LazyBodyToWrite(text, false).dictionary, nullptr);
-    EXPECT_EQ(LazyBodyToWrite(text, false).text, text->GetStoredBytes());
-    EXPECT_EQ(LazyBodyToWrite(text, true).text, nullptr);
-    EXPECT_EQ(Text(LazyBodyToWrite(text, true).dictionary->ToJson(false)), R"({"a": 1})");
+    EXPECT_EQ(LazyBodyToWrite(text, false, false).dictionary, nullptr);
+    EXPECT_EQ(LazyBodyToWrite(text, false, false).text, text->GetStoredBytes());
+    EXPECT_EQ(LazyBodyToWrite(text, true, true).text, nullptr);
+    EXPECT_EQ(Text(LazyBodyToWrite(text, true, true).dictionary->ToJson(false)), R"({"a": 1})");
     ref<Dictionary> dictionary = Parse("{}");
-    EXPECT_EQ(LazyBodyToWrite(NewLazyBody(&pool, dictionary, 0), false).dictionary, dictionary);
+    EXPECT_EQ(LazyBodyToWrite(NewLazyBody(&pool, dictionary, 0), false, true).dictionary, dictionary);
     EXPECT_EQ(NewLazyBody(&pool, dictionary, 7)->GetStoredDictionary(), dictionary);
     EXPECT_EQ(NewLazyBody(&pool, dictionary, 7)->GetVersion(), OrvoVersion(7));
     EXPECT_EQ(NewEmptyLazyBody(&pool)->GetRep(), LazyDict::REP_JSON);

@@ -2,6 +2,9 @@
 
 /// All of the library but the record classes, which are `sornschema/<Record>.h` and `sornschema/all.h`.
 
+#include "sorn/binary/GoogleInt.h"
+#include "sorn/binary/ProtoBuf.h"
+#include "sorn/binary/ProtoBufByteOutputStream.h"
 #include "sorn/convert/DictionarySornObject.h"
 #include "sorn/dict/ArrayValue.h"
 #include "sorn/dict/Base64.h"
@@ -22,3 +25,4 @@
 #include "sorn/model/Schema.h"
 #include "sorn/model/SornObject.h"
 #include "sorn/model/StructInfoMap.h"
+#include "sorn/typedjson/JsonSornObject.h"

@@ -6,6 +6,7 @@
 #include "sorn/convert/EnumNameIndex.h"
 #include "sorn/dict/Dict.h"
 #include "sorn/dict/ScalarFormat.h"
+#include "sorn/model/CopyShort.h"
 #include "sorn/model/InternedString.h"
 #include "sorn/model/Schema.h"
 
@@ -17,16 +18,17 @@ const char* PrefixOf(const StructInfo& info) {
     return info.idPrefix != nullptr ? info.idPrefix : "";
 }
 
-RoxString IdText(RoxMempool* pool, StructTable table, const FieldInfo& field, const char* id, size_t nId) {
-    const StructInfo* info = table.Find(field.typeRef);
-    if (info == nullptr) return RoxString::FromUtf8Bytes(pool, 3, "XXX");
-    char text[maxIdBytesG];
-    const char* prefix = PrefixOf(*info);
-    size_t nPrefix = std::min<size_t>(strlen(prefix), maxIdBytesG);
-    memcpy(text, prefix, nPrefix);
+/// Writes prefix and id, cut at maxIdBytesG bytes; gives the length.
+unsigned WriteId(const char* prefix, const char* id, size_t nId, char* out) {
+    if (prefix == nullptr) {
+        memcpy(out, "XXX", 3);
+        return 3;
+    }
+    const size_t nPrefix = std::min<size_t>(strlen(prefix), maxIdBytesG);
+    memcpy(out, prefix, nPrefix);
     nId = std::min<size_t>(nId, maxIdBytesG - nPrefix);
-    memcpy(text + nPrefix, id, nId);
-    return RoxString::FromUtf8Bytes(pool, static_cast<unsigned>(nPrefix + nId), text);
+    memcpy(out + nPrefix, id, nId);
+    return static_cast<unsigned>(nPrefix + nId);
 }
 
 }  // namespace
@@ -50,14 +52,35 @@ bool EnumValue(const FieldInfo& field, const RoxString& name, uint32_t& value, E
     return false;
 }
 
-RoxString LongIdText(RoxMempool* pool, StructTable table, const FieldInfo& field, uint64_t id) {
+const char* IdPrefix(StructTable table, const FieldInfo& field) {
+    const StructInfo* info = table.Find(field.typeRef);
+    return info != nullptr ? PrefixOf(*info) : nullptr;
+}
+
+unsigned WriteLongId(StructTable table, const FieldInfo& field, uint64_t id, char* out) {
+    const char* prefix = IdPrefix(table, field);
+    if (prefix != nullptr) {
+        const size_t nPrefix = strlen(prefix);
+        if (nPrefix + scalarformat::maxTextBytesG <= maxIdBytesG) {
+            CopyShort(prefix, nPrefix, reinterpret_cast<unsigned char*>(out));
+            return static_cast<unsigned>(scalarformat::WriteLongId(id, out + nPrefix) - out);
+        }
+    }
     char number[scalarformat::maxTextBytesG];
     const char* end = scalarformat::WriteLongId(id, number);
-    return IdText(pool, table, field, number, static_cast<size_t>(end - number));
+    return WriteId(prefix, number, static_cast<size_t>(end - number), out);
+}
+
+RoxString LongIdText(RoxMempool* pool, StructTable table, const FieldInfo& field, uint64_t id) {
+    char text[maxIdBytesG];
+    const unsigned n = WriteLongId(table, field, id, text);
+    return RoxString::FromUtf8Bytes(pool, n, text);
 }
 
 RoxString StringIdText(RoxMempool* pool, StructTable table, const FieldInfo& field, const RoxString& id) {
-    return IdText(pool, table, field, id.Utf8(), id.NByte());
+    char text[maxIdBytesG];
+    const unsigned n = WriteId(IdPrefix(table, field), id.Utf8(), id.NByte(), text);
+    return RoxString::FromUtf8Bytes(pool, n, text);
 }
 
 const char* BareId(StructTable table, const FieldInfo& field, const RoxString& text, ErrorWords& words) {

@@ -27,6 +27,12 @@ bool EnumValue(const FieldInfo& field, const RoxString& name, uint32_t& value, E
 RoxString LongIdText(RoxMempool* pool, StructTable table, const FieldInfo& field, uint64_t id);
 RoxString StringIdText(RoxMempool* pool, StructTable table, const FieldInfo& field, const RoxString& id);
 
+/// The prefix of the field's ids, which may be empty; null for a field without a struct.
+const char* IdPrefix(StructTable table, const FieldInfo& field);
+/// LongIdText without a string of its own: at most maxIdBytesG bytes into `out`, without a NUL; gives the
+/// length.
+unsigned WriteLongId(StructTable table, const FieldInfo& field, uint64_t id, char* out);
+
 /// What follows the prefix of the field's struct in a text, as a pointer into the text. Null and words when
 /// the field has no struct or the text does not begin with the prefix.
 const char* BareId(StructTable table, const FieldInfo& field, const RoxString& text, ErrorWords& words);

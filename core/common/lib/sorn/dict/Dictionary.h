@@ -82,6 +82,12 @@ class Dictionary final : public DictValue {
     static ref<Dictionary> FromJson(const RoxString& text, RoxString& error, RoxMempool* pool);
     static ref<Dictionary> FromJsonBytestring(const ref<rox::ByteBuffer>& bytes, RoxString& error,
                                               RoxMempool* pool);
+    /// Reads a whole JSON text from a source, which is released whatever comes, by the rules of JsonParser:
+    /// real JSON, in UTF-8; a name that comes twice gets two values. On failure `error` is set, in the pool,
+    /// and the result may be null or hold what was built until then, which is not to be used; on success
+    /// `error` is untouched. So hand in an empty string and look at it first.
+    static ref<Dictionary> FromJsonBytesource(kelbaselib::Bytesource* source, RoxString& error,
+                                              RoxMempool* pool);
     /// Reads the members of an object into this dictionary, the cursor standing before its '{'. False and
     /// words on failure; what was read until then stays.
     bool FromJson(InputPointer& cursor, RoxString& error);

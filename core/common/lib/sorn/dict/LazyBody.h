@@ -39,7 +39,7 @@ ref<Dict> DictOfLazyBody(RoxMempool* pool, const ref<LazyDict>& body);
 /// LazyDict::operator==; null equals only null.
 bool FEqualLazyBodies(const ref<LazyDict>& a, const ref<LazyDict>& b);
 /// LazyDict::ToWrite; the body is not null.
-LazyBodyContent LazyBodyToWrite(const ref<LazyDict>& body, bool pretty);
+LazyBodyContent LazyBodyToWrite(const ref<LazyDict>& body, bool pretty, bool isForSink);
 /// LazyDict::FromBytestring without a version; null for no bytes, and for bytes that open with 0.
 ref<LazyDict> NewLazyBodyOfBytes(RoxMempool* pool, const ref<rox::ByteBuffer>& bytes);
 /// LazyDict::FromBytesource without a version: takes the source's ownership.

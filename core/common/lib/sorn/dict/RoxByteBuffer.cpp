@@ -12,9 +12,23 @@ void SizedObjectArray<1, RoxMempool>::Realloc(uint32_t n) {
     const uint32_t capacity = std::max(n, minCapacityG);
     auto* const storage = static_cast<unsigned char*>(RoxMempool::CallocIn(poolM, capacity));
     if (lengthM != 0) std::memcpy(storage, dataM, lengthM);
-    RoxMempool::FreeIn(poolM, dataM);
+    FreeStorage();
     dataM = storage;
     capacityM = capacity;
+}
+
+void SizedObjectArray<1, RoxMempool>::Allot(uint32_t n) {
+    FreeStorage();
+    capacityM = std::max(n, minCapacityG);
+    dataM = static_cast<unsigned char*>(RoxMempool::MallocIn(poolM, capacityM));
+    lengthM = n;
+}
+
+void SizedObjectArray<1, RoxMempool>::Borrow(unsigned char* data, uint32_t n) {
+    FreeStorage();
+    capacityM = 0;
+    dataM = data;
+    lengthM = n;
 }
 
 const char ByteBuffer::classTagG = 0;
@@ -22,7 +36,7 @@ const char ByteBuffer::classTagG = 0;
 ByteBuffer::~ByteBuffer() = default;
 
 ref<ByteBuffer> ByteBuffer::New(RoxMempool* pool, const void* bytes, uint32_t n) {
-    ref<ByteBuffer> result = NewOfLength(pool, n);
+    ref<ByteBuffer> result = NewToFill(pool, n);
     if (n != 0) std::memcpy(result->MutableData(), bytes, n);
     return result;
 }
@@ -37,6 +51,23 @@ ref<ByteBuffer> ByteBuffer::NewOfLength(RoxMempool* pool, uint32_t n) {
         result->bytesM.Realloc(n);
         result->bytesM.SetLength(n);
     }
+    return result;
+}
+
+ref<ByteBuffer> ByteBuffer::NewToFill(RoxMempool* pool, uint32_t n) {
+    ref<ByteBuffer> result(new (pool) ByteBuffer(pool));
+    if (n != 0) result->bytesM.Allot(n);
+    return result;
+}
+
+ref<ByteBuffer> ByteBuffer::NewSlice(RoxMempool* pool, const ref<ByteBuffer>& owner, uint32_t offset,
+                                     uint32_t n) {
+    RoxAssert(offset <= owner->GetLength() && n <= owner->GetLength() - offset,
+              "ByteBuffer: slice outside its owner");
+    ref<ByteBuffer> result(new (pool) ByteBuffer(pool));
+    if (n == 0) return result;
+    result->bytesM.Borrow(owner->bytesM.GetData() + offset, n);
+    result->ownerM = owner->ownerM != nullptr ? owner->ownerM : owner;
     return result;
 }
 

@@ -20,11 +20,17 @@ class SizedObjectArray<1, RoxMempool> {
     explicit SizedObjectArray(RoxMempool* pool) : poolM(pool) {}
     SizedObjectArray(const SizedObjectArray&) = delete;
     SizedObjectArray& operator=(const SizedObjectArray&) = delete;
-    ~SizedObjectArray() { RoxMempool::FreeIn(poolM, dataM); }
+    ~SizedObjectArray() { FreeStorage(); }
 
     /// Moves the elements to new, cleared storage of exactly n elements, 8 at least. n must not be below the
     /// length.
     void Realloc(uint32_t n);
+    /// New storage of exactly n elements, 8 at least, all of them to be written by the caller; the old ones
+    /// are gone.
+    void Allot(uint32_t n);
+    /// n elements that lie somewhere else, for as long as this array refers to them. They are not its own:
+    /// the capacity is 0.
+    void Borrow(unsigned char* data, uint32_t n);
 
     unsigned char* GetData() const { return dataM; }  ///< null without storage
     uint32_t GetCapacity() const { return capacityM; }
@@ -33,6 +39,10 @@ class SizedObjectArray<1, RoxMempool> {
     void SetLength(uint32_t n) { lengthM = n; }
 
  private:
+    void FreeStorage() {
+        if (capacityM != 0) RoxMempool::FreeIn(poolM, dataM);
+    }
+
     RoxMempool* poolM;
     unsigned char* dataM = nullptr;
     uint32_t capacityM = 0;
@@ -58,18 +68,31 @@ class ByteBuffer : public RoxCore {
     static ref<ByteBuffer> New(RoxMempool* pool, const RoxString& text);
     /// A new one of n bytes, cleared, for the caller to fill.
     static ref<ByteBuffer> NewOfLength(RoxMempool* pool, uint32_t n);
+    /// The same, not cleared: the caller writes all n bytes before anybody reads them.
+    static ref<ByteBuffer> NewToFill(RoxMempool* pool, uint32_t n);
+    /// A new one in the pool of n bytes of another buffer from `offset` on, without a copy: it holds a
+    /// reference on the buffer that owns the bytes, never on another slice, and has no capacity. The range
+    /// must lie in the owner, which must not change any more, and whose pool must outlive the slice. A slice
+    /// of no bytes holds nothing.
+    static ref<ByteBuffer> NewSlice(RoxMempool* pool, const ref<ByteBuffer>& owner, uint32_t offset,
+                                    uint32_t n);
 
     const unsigned char* GetData() const { return bytesM.GetData(); }  ///< null without storage
-    /// For whoever made the buffer, before it is shared.
+    /// For whoever made the buffer, before it is shared; not for slices.
     unsigned char* MutableData() { return bytesM.GetData(); }
     uint32_t GetLength() const { return bytesM.GetLength(); }
     uint32_t GetCapacity() const { return bytesM.GetCapacity(); }
     bool FEmpty() const { return bytesM.GetLength() == 0; }
+    /// The buffer that owns the bytes of a slice, else null.
+    const ref<ByteBuffer>& GetOwner() const { return ownerM; }
 
     void* VkCastHelper(const void* classTag) override;
 
  protected:
     SizedObjectArray<1, RoxMempool> bytesM;
+
+ private:
+    ref<ByteBuffer> ownerM;
 };
 
 }  // namespace rox

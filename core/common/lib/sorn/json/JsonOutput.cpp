@@ -83,7 +83,7 @@ RoxString JsonTextOutput::Take() {
     return RoxString::AdoptRepN(text);
 }
 
-JsonSinkOutput::JsonSinkOutput(kelbaselib::Bytesink& sink) : sinkM(sink) {
+JsonSinkOutput::JsonSinkOutput(kelbaselib::Bytesink& sink) : JsonOutput(true), sinkM(sink) {
     pBeginM = pNextM = windowM;
     pEndM = windowM + windowG;
 }

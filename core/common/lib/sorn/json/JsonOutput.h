@@ -45,8 +45,12 @@ class JsonOutput {
     }
     void Blanks(size_t n);
 
+    /// Whether the text goes to a sink. Bodies that are objects have another text there:
+    /// LazyDict::ToJsonBytesink.
+    bool FSink() const { return isSinkM; }
+
  protected:
-    JsonOutput() = default;
+    explicit JsonOutput(bool isSink = false) : isSinkM(isSink) {}
     ~JsonOutput() = default;
     /// Hands on what stands in the window and opens one of at least n bytes.
     virtual void NextWindow(unsigned n) = 0;
@@ -54,6 +58,9 @@ class JsonOutput {
     unsigned char* pBeginM = nullptr;  // the window
     unsigned char* pNextM = nullptr;
     unsigned char* pEndM = nullptr;
+
+ private:
+    bool isSinkM;
 };
 
 /// Writes behind what stands in a byte buffer, which must be left alone until this object is gone.

@@ -8,8 +8,7 @@ namespace sorn::stringwriter {
 
 namespace {
 
-constexpr size_t maxEscapedG = 6;  // bytes that one byte becomes at most
-constexpr size_t pieceG = 128;     // bytes that are escaped at once
+constexpr size_t pieceG = maxShortG;  // bytes that are escaped at once
 static_assert(pieceG * maxEscapedG + 2 <= JsonOutput::maxRoomG);
 
 using Bytes = const unsigned char*;
@@ -131,6 +130,11 @@ void WriteAll(Bytes p, Bytes end, JsonOutput& out) {
 }
 
 }  // namespace
+
+unsigned char* PutEscaped(const char* bytes, size_t n, unsigned char* out) {
+    const Bytes p = reinterpret_cast<Bytes>(bytes);
+    return WritePiece(p, p + n, p + n, out);
+}
 
 void WriteQuoted(const char* bytes, size_t n, JsonOutput& out) {
     const Bytes p = reinterpret_cast<Bytes>(bytes);

@@ -11,6 +11,12 @@ namespace sorn::stringwriter {
 /// The n bytes in quotes, escaped.
 void WriteQuoted(const char* bytes, size_t n, JsonOutput& out);
 
+/// Short texts go straight to memory, in which there is room for maxEscapedG bytes for each of theirs: the n
+/// bytes, at most maxShortG, escaped and without quotes. Gives the end of what is written.
+constexpr size_t maxEscapedG = 6;  ///< bytes that one byte becomes at most
+constexpr size_t maxShortG = 128;
+unsigned char* PutEscaped(const char* bytes, size_t n, unsigned char* out);
+
 /// The text in quotes if `fQuote`, else in quotes only if a byte before its first NUL is no ASCII letter,
 /// digit or '-'. Escaped in both cases. Without quotes the empty text writes nothing.
 void WriteText(const RoxString& text, bool fQuote, JsonOutput& out);

@@ -6,6 +6,7 @@
 #include "sorn/dict/RoxByteBuffer.h"
 #include "sorn/dict/StringValue.h"
 #include "sorn/json/StringWriter.h"
+#include "sorn/model/SornObject.h"
 
 namespace sorn {
 
@@ -32,15 +33,16 @@ void Prefetch(const DictValue* value) {
 
 }  // namespace
 
-void ValueWriter::Write(const DictValue& value) {
-    Begin(value);
-    while (!framesM.FEmpty()) {
+bool ValueWriter::Run(size_t depth) {
+    while (objectM == nullptr) {
+        if (framesM.Size() <= depth) return true;
         if (framesM.Top().array != nullptr) {
             ContinueArray();
         } else {
             ContinueDictionary();
         }
     }
+    return false;
 }
 
 bool ValueWriter::Begin(const DictValue& value) {
@@ -68,20 +70,29 @@ bool ValueWriter::BeginNullOrLazy(const DictValue& value) {
         outM.Literal("null");
         return true;
     }
-    const auto [dictionary, text, object, version] = LazyBodyToWrite(lazy->GetValue(), formatM.isPretty);
-    if (dictionary == nullptr) {
-        if (text != nullptr) outM.Bytes(text->GetData(), text->GetLength());
-        return true;
+    LazyBodyContent content = LazyBodyToWrite(lazy->GetValue(), formatM.isPretty, outM.FSink());
+    if (content.dictionary != nullptr) {
+        BeginBody(content.dictionary);
+        return false;
     }
+    if (content.object != nullptr) {
+        objectM = std::move(content.object);
+        objectVersionM = content.version;
+        return false;
+    }
+    if (content.text != nullptr) outM.Bytes(content.text->GetData(), content.text->GetLength());
+    return true;
+}
+
+void ValueWriter::BeginBody(const ref<Dictionary>& dictionary) {
     dictionary->UpRef();
     bodiesM.Push({dictionary.get(), formatM.indentLevel});
     formatM.indentLevel = 0;
     BeginDictionary(*dictionary);
     framesM.Top().isBody = true;
-    return false;
 }
 
-/// Leaves the dictionary of a lazy body.
+/// Leaves what BeginBody opened.
 void ValueWriter::EndBody() {
     const Body body = bodiesM.Top();
     bodiesM.Pop();
@@ -144,7 +155,7 @@ void ValueWriter::ContinueDictionary() {
     End('}');
 }
 
-/// False when a container opened.
+/// As Begin.
 bool ValueWriter::WriteMember(Frame& frame, const DictionaryEntries::Name& name, const DictValue& value) {
     if (frame.isBehindFirst) outM.Literal(", ");
     frame.isBehindFirst = true;

@@ -25,8 +25,8 @@ bool FEqualLazyBodies(const ref<LazyDict>& a, const ref<LazyDict>& b) {
     return *a == *b;
 }
 
-LazyBodyContent LazyBodyToWrite(const ref<LazyDict>& body, bool pretty) {
-    return body->ToWrite(pretty);
+LazyBodyContent LazyBodyToWrite(const ref<LazyDict>& body, bool pretty, bool isForSink) {
+    return body->ToWrite(pretty, isForSink);
 }
 
 ref<LazyDict> NewLazyBodyOfBytes(RoxMempool* pool, const ref<rox::ByteBuffer>& bytes) {

@@ -7,10 +7,7 @@
 #include "sorn/model/OrvoVersion.h"
 
 namespace kelbaselib {
-class Bytesource;
-}
-namespace rox {
-class ByteBuffer;
+class Bytesink;
 }
 
 namespace sorn {
@@ -59,23 +56,62 @@ class LazyDict final : public RoxCore {
     /// Replaces the dictionary and does not touch the representation.
     void SetDictionary(const ref<Dictionary>& dictionary);
 
-    // Conversions.
+    // Queries. They are the only operations that read a REP_BYTESOURCE body for good: once read, it is a
+    // REP_DICTIONARY body and its source is released. An unreadable one stays as it is, and they give false.
+
+    /// The id of the struct that the body's "type" names; false when it names none. A REP_PROTOBUF body that
+    /// does not unmarshal answers with the id of the struct "error".
+    bool GetType(unsigned* structId);
+    /// The body's "type" itself, without a look at any table: a name that no struct has is given, too. False
+    /// without one.
+    bool GetTypeName(RoxString* name);
+
+    // Conversions. Readers on several threads may share a body as long as nobody asks the queries above.
 
     /// The body as a Dict, never null: a failure gives a dictionary of type "error" with "code" and "text".
     ref<Dict> ToDict() const;
-    /// The body as a dictionary, or null and words, which replace what `error` holds. The one of a REP_DICT
-    /// or REP_DICTIONARY body is shared, not copied.
+    /// The body as a dictionary, or null and words, which replace what `error` holds; a stream that cannot be
+    /// read gives none. The dictionary of a REP_DICT or REP_DICTIONARY body is shared, not copied. A
+    /// REP_PROTOBUF body that does not unmarshal gives the dictionary of an error.
     ref<Dictionary> ToDictionary(RoxString& error) const;
-    /// The body as an object, or null and words; an empty `error` is to be handed in, for some words are
-    /// appended. A REP_OBJECT body is shared, not copied.
+    /// The body as an object, or null and words; `error` is to be handed in empty, for some words are
+    /// appended to it. The object of a REP_OBJECT body is shared, not copied.
+    ///
+    /// Bodies of JSON text take one of two roads, chosen by the feature VK_FEATURE_TYPED_JSON: through a
+    /// dictionary (off), which honours the version and required fields, or by the typed reader (on), which
+    /// does not. Either is measured; the figures of a channelMapConfigInstructions go to the log.
     ref<SornObject> ToSornObjectOrErrorString(RoxString& error) const;
-    /// The same, with an object of type "error" for the words in place of null.
+    /// The same with an object of type "error" for the words in place of null.
     ref<SornObject> ToSornObjectOrError() const;
-    /// What the body's JSON text is made of, for writers that walk values without recursion.
-    LazyBodyContent ToWrite(bool pretty) const;
-    /// Appends the body's JSON text. JSON bytes go out as they are unless `pretty`; an unreadable body writes
-    /// nothing.
+    /// The same without words: true when `out` is not null.
+    bool ToSornObject(ref<SornObject>& out) const;
+    /// The body as a known-dict value of the binary form, never null. The bytes of a REP_PROTOBUF body are
+    /// shared, not copied. What cannot become an object is an object of type "error".
+    ref<rox::ByteBuffer> ToProtobuf() const;
+
+    // JSON text. A body of JSON text gives its bytes as they are unless `pretty`; an unreadable body gives
+    // nothing. Compact text of objects and of the binary form is the typed writer's, in the order of slots;
+    // all other text is the dictionary writer's, sorted.
+
+    /// Appends the text.
     void ToJsonByteBuffer(ByteBuffer& out, bool pretty) const;
+    /// Hands the text to the sink and stops in silence when it takes nothing more. With the feature
+    /// VK_FEATURE_TYPED_JSON off, objects and the binary form go through a dictionary even when compact: this
+    /// differs from the other operations, and users count on it.
+    void ToJsonBytesink(kelbaselib::Bytesink& out, bool pretty) const;
+    /// The text in a byte buffer; the very buffer of a body of JSON text, unless `pretty`.
+    ref<rox::ByteBuffer> ToJsonBytestring(bool pretty) const;
+    RoxString ToJson(bool pretty) const;
+    /// What the text of ToJsonByteBuffer, or of ToJsonBytesink, is made of, for writers that walk values
+    /// without recursion.
+    LazyBodyContent ToWrite(bool pretty, bool isForSink) const;
+
+    /// Reads the whole of a REP_BYTESOURCE body by a source of its own into `out`, which holds a part of the
+    /// body when that fails. RoxAssertFail for a body of another representation or without its source.
+    bool GetDictionaryFromBytesource(ref<Dictionary>& out) const;
+    /// Makes a REP_BYTESOURCE body a REP_DICTIONARY one, if it can be read, and releases its source.
+    void BuildDictionaryFromBytesource();
+
     /// Equal contents, whatever the representations: both sides through ToDict, compared as Dict::operator==
     /// does, by their compact texts; so without recursion, however deep bodies lie in bodies.
     bool operator==(const LazyDict& other) const;
@@ -94,6 +130,14 @@ class LazyDict final : public RoxCore {
  private:
     LazyDict(RoxMempool* pool, Rep rep, OrvoVersion version) : RoxCore(pool), repM(rep), versionM(version) {}
 
+    ref<Dictionary> ReadBytesource(RoxString& error) const;
+    ref<Dictionary> ToDictionaryOrError() const;
+    ref<SornObject> ObjectToName() const;
+    ref<Dictionary> DictionaryToName() const;
+    ref<SornObject> Decode() const;
+    ref<SornObject> ObjectOfDictionary(const ref<Dictionary>& dictionary, RoxString& error) const;
+    ref<SornObject> ObjectOfText(RoxString& error) const;
+    ref<SornObject> ObjectOfStream(RoxString& error) const;
     ref<Dictionary> NewErrorDictionary(const char* code, const RoxString& text) const;
     ref<SornObject> NewErrorObject(const RoxString& text) const;
 

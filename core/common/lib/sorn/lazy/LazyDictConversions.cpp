@@ -1,10 +1,11 @@
+#include "kelbaselib/Bytesource.h"
+#include "rox/RoxAssert.h"
+#include "sorn/binary/ProtoBuf.h"
 #include "sorn/convert/DictionarySornObject.h"
-#include "sorn/dict/ByteBuffer.h"
 #include "sorn/dict/Dict.h"
 #include "sorn/dict/Dictionary.h"
 #include "sorn/dict/MempoolNew.h"
 #include "sorn/dict/RoxByteBuffer.h"
-#include "sorn/json/JsonFormat.h"
 #include "sorn/lazy/LazyDict.h"
 #include "sorn/model/InternedString.h"
 #include "sorn/model/Schema.h"
@@ -18,20 +19,20 @@ ref<Dictionary> LazyDict::ToDictionary(RoxString& error) const {
         case REP_DICT:
             return dictM != nullptr ? dictM->GetDictionary() : nullptr;
         case REP_JSON:
-            if (bytesM == nullptr) return nullptr;
-            return Dictionary::FromJsonBytestring(bytesM, error, GetMempool());
-        case REP_OBJECT:
-            if (objectM == nullptr) return nullptr;
+            return bytesM != nullptr ? Dictionary::FromJsonBytestring(bytesM, error, GetMempool()) : nullptr;
+        case REP_PROTOBUF:
+        case REP_OBJECT: {
+            const ref<SornObject> object = repM == REP_OBJECT ? objectM : Decode();
+            if (object == nullptr) return nullptr;
             return DictionarySornObject(GetMempool(), Schema::vStructDefG, Schema::nStructDefG)
-                .SornObjectToDictionary(objectM.get(), versionM);
+                .SornObjectToDictionary(object.get(), versionM);
+        }
         case REP_DICTIONARY:
             return dictionaryM;
-        case REP_PROTOBUF:
-            error = "protobuf did not unmarshal";
-            return nullptr;
-        case REP_BYTESOURCE:
-            error = "byte source was not read";
-            return nullptr;
+        case REP_BYTESOURCE: {
+            RoxString lost;  // an unreadable stream gives no words here
+            return ReadBytesource(lost);
+        }
     }
     error = "LazyDict to Dictionary: unknown representation in LazyDict";
     return nullptr;
@@ -39,55 +40,75 @@ ref<Dictionary> LazyDict::ToDictionary(RoxString& error) const {
 
 ref<Dict> LazyDict::ToDict() const {
     if (repM == REP_DICT && dictM != nullptr) return dictM;
+    return MempoolNew<Dict>(GetMempool(), ToDictionaryOrError());
+}
+
+ref<rox::ByteBuffer> LazyDict::ToProtobuf() const {
+    if (repM > REP_BYTESOURCE) return rox::ByteBuffer::NewOfLength(GetMempool(), 0);
+    if (repM == REP_PROTOBUF && bytesM != nullptr) return bytesM;
+    ref<SornObject> object = objectM;
+    if (repM != REP_OBJECT || object == nullptr) {
+        RoxString error;
+        object = ObjectOfDictionary(ToDictionaryOrError(), error);
+        if (object == nullptr) {
+            object =
+                NewErrorObject(RoxString::Format(GetMempool(), "%sDict did not unmarshal", error.Utf8()));
+        }
+    }
+    return ProtoBuf(GetMempool(), Schema::vStructDefG, Schema::nStructDefG).MarshalKnownDict(object.get());
+}
+
+bool LazyDict::GetDictionaryFromBytesource(ref<Dictionary>& out) const {
     RoxString error;
+    if (repM != REP_BYTESOURCE || bytesourceM == nullptr) RoxAssertFail("%s: no byte source", __func__);
+    kelbaselib::Bytesource* const source = bytesourceM->NewSource();
+    out = nullptr;
+    if (source == nullptr) return false;
+    out = Dictionary::FromJsonBytesource(source, error, GetMempool());
+    return out != nullptr && error.FEmpty();
+}
+
+void LazyDict::BuildDictionaryFromBytesource() {
     ref<Dictionary> dictionary;
-    if (repM > REP_BYTESOURCE) {
-        dictionary = NewErrorDictionary("internalError", "bad rep in LazyDict");
-    } else {
-        dictionary = ToDictionary(error);
-        if (dictionary == nullptr) dictionary = NewErrorDictionary("badArgument", error);
-    }
-    return MempoolNew<Dict>(GetMempool(), dictionary);
-}
-
-ref<SornObject> LazyDict::ToSornObjectOrErrorString(RoxString& error) const {
-    if (repM == REP_OBJECT) return objectM;
-    ref<SornObject> object;
-    const ref<Dictionary> dictionary = ToDictionary(error);
-    if (dictionary == nullptr) return nullptr;
-    DictionarySornObject(GetMempool(), Schema::vStructDefG, Schema::nStructDefG)
-        .DictionaryToSornObject(dictionary, versionM, object, error);
-    return object;
-}
-
-ref<SornObject> LazyDict::ToSornObjectOrError() const {
-    RoxString error;
-    ref<SornObject> object = ToSornObjectOrErrorString(error);
-    return object != nullptr ? object : NewErrorObject(error);
-}
-
-LazyBodyContent LazyDict::ToWrite(bool pretty) const {
-    LazyBodyContent content;
-    if (repM == REP_JSON && !pretty) {
-        content.text = bytesM;
-    } else {
-        RoxString error;  // goes nowhere
-        content.dictionary = ToDictionary(error);
-    }
-    return content;
-}
-
-void LazyDict::ToJsonByteBuffer(ByteBuffer& out, bool pretty) const {
-    const LazyBodyContent content = ToWrite(pretty);
-    if (content.dictionary != nullptr) {
-        content.dictionary->ToJson(out, JsonFormat(pretty));
-    } else if (content.text != nullptr) {
-        out.AppendBytes(content.text->GetData(), content.text->GetLength());
-    }
+    if (dictionaryM != nullptr || bytesourceM == nullptr || !GetDictionaryFromBytesource(dictionary)) return;
+    dictionaryM = dictionary;
+    repM = REP_DICTIONARY;
+    bytesourceM->Release();
+    bytesourceM = nullptr;
 }
 
 bool LazyDict::operator==(const LazyDict& other) const {
     return *ToDict() == *other.ToDict();
+}
+
+/// The object of a REP_PROTOBUF body; an error object when it does not unmarshal, null without bytes.
+ref<SornObject> LazyDict::Decode() const {
+    if (bytesM == nullptr) return nullptr;
+    ref<SornObject> object;
+    ProtoBuf codec(GetMempool(), Schema::vStructDefG, Schema::nStructDefG);
+    return codec.UnmarshalKnownDict(bytesM, &object) ? object : NewErrorObject("protobuf did not unmarshal");
+}
+
+/// The dictionary of a stream, or null and the parser's words.
+ref<Dictionary> LazyDict::ReadBytesource(RoxString& error) const {
+    kelbaselib::Bytesource* const source = bytesourceM != nullptr ? bytesourceM->NewSource() : nullptr;
+    if (source == nullptr) return nullptr;
+    const ref<Dictionary> dictionary = Dictionary::FromJsonBytesource(source, error, GetMempool());
+    return error.FEmpty() ? dictionary : nullptr;
+}
+
+ref<Dictionary> LazyDict::ToDictionaryOrError() const {
+    if (repM > REP_BYTESOURCE) return NewErrorDictionary("internalError", "bad rep in LazyDict");
+    RoxString error;
+    ref<Dictionary> dictionary = repM == REP_BYTESOURCE ? ReadBytesource(error) : ToDictionary(error);
+    return dictionary != nullptr ? dictionary : NewErrorDictionary("badArgument", error);
+}
+
+ref<SornObject> LazyDict::ObjectOfDictionary(const ref<Dictionary>& dictionary, RoxString& error) const {
+    ref<SornObject> object;
+    DictionarySornObject(GetMempool(), Schema::vStructDefG, Schema::nStructDefG)
+        .DictionaryToSornObject(dictionary, versionM, object, error);
+    return object;
 }
 
 ref<Dictionary> LazyDict::NewErrorDictionary(const char* code, const RoxString& text) const {

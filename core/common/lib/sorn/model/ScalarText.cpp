@@ -1,5 +1,6 @@
 #include "sorn/model/ScalarText.h"
 
+#include <charconv>
 #include <cstring>
 #include <ctime>
 #include <limits>
@@ -139,15 +140,8 @@ bool ReadDecimal(const char*& p, const char* end, int32_t& value) {
 }
 
 char* WriteUnsigned(uint64_t value, char* out) {
-    char digits[20];
-    char* p = digits + sizeof digits;
-    do {
-        *--p = static_cast<char>('0' + value % 10);
-        value /= 10;
-    } while (value != 0);
-    const size_t n = static_cast<size_t>(digits + sizeof digits - p);
-    std::memcpy(out, p, n);
-    return out + n;
+    constexpr int maxDigits = 20;
+    return std::to_chars(out, out + maxDigits, value).ptr;
 }
 
 char* WriteDecimal(int64_t value, char* out) {

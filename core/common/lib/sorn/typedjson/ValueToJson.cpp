@@ -7,7 +7,7 @@
 #include "sorn/dict/NullValue.h"
 #include "sorn/dict/RoxByteBuffer.h"
 #include "sorn/dict/StringValue.h"
-#include "sorn/json/ValueWriter.h"
+#include "sorn/typedjson/JsonTreeWriter.h"
 
 namespace sorn {
 
@@ -15,12 +15,12 @@ namespace {
 
 void WriteValue(const DictValue& value, ByteBuffer& out, JsonFormat format) {
     JsonBufferOutput output(out);
-    ValueWriter(value.GetMempool(), output, format).Write(value);
+    JsonTreeWriter(value.GetMempool(), output, format).Write(value);
 }
 
 void WriteValue(const DictValue& value, kelbaselib::Bytesink& out, JsonFormat format) {
     JsonSinkOutput output(out);
-    ValueWriter(value.GetMempool(), output, format).Write(value);
+    JsonTreeWriter(value.GetMempool(), output, format).Write(value);
 }
 
 }  // namespace
@@ -62,7 +62,7 @@ void LazyDictValue::ToJson(kelbaselib::Bytesink& out, JsonFormat format) const {
 
 RoxString DictValue::ToJson(bool pretty) const {
     JsonTextOutput output(GetMempool());
-    ValueWriter(GetMempool(), output, JsonFormat(pretty)).Write(*this);
+    JsonTreeWriter(GetMempool(), output, JsonFormat(pretty)).Write(*this);
     return output.Take();
 }
 

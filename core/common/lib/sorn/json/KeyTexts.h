@@ -1,0 +1,37 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+
+#include "rox/RoxString.h"
+
+namespace sorn {
+
+/// Texts of keys that came lately, so that a key which comes again shares one representation, and its hash. A
+/// key that another one has put out of its place is made anew: a cache, not an index.
+class KeyTexts {
+ public:
+    RoxString Get(RoxMempool* pool, const unsigned char* bytes, uint32_t n) {
+        // Long keys are rare, and would be kept for nothing.
+        if (n > maxBytesG) return RoxString::FromUtf8Bytes(pool, n, bytes);
+        RoxString& text = vTextM[Index(bytes, n)];
+        if (text.NByte() != n || std::memcmp(text.Utf8(), bytes, n) != 0) {
+            text = RoxString::FromUtf8Bytes(pool, n, bytes);
+        }
+        return text;
+    }
+
+ private:
+    static constexpr uint32_t maxBytesG = 64;
+    static constexpr unsigned nBitsG = 8;
+
+    static uint32_t Index(const unsigned char* bytes, uint32_t n) {
+        uint32_t sum = n;
+        for (uint32_t i = 0; i < n; ++i) sum = sum * 31 + bytes[i];
+        return (sum * 0x9E3779B1u) >> (32 - nBitsG);
+    }
+
+    RoxString vTextM[1u << nBitsG];
+};
+
+}  // namespace sorn

@@ -1,0 +1,43 @@
+#pragma once
+
+#include <cstddef>
+
+#include "sorn/convert/ErrorWords.h"
+#include "sorn/typedjson/ObjectReaderLevels.h"
+
+namespace sorn {
+
+/// The words of a failing read, which its parts share. They are dropped while the read is inside an object of
+/// a typed field, as is required: what goes wrong there stays untold.
+class ObjectReaderWords {
+ public:
+    ObjectReaderWords(RoxMempool* pool, RoxString& target) : wordsM(pool, target) {}
+
+    void SetSilent(bool isSilent) { isSilentM = isSilent; }
+    bool FSilent() const { return isSilentM; }
+
+    /// Each gives false, for callers that fail with it.
+    bool Replace(const char* text) {
+        if (!isSilentM) wordsM.Replace(text);
+        return false;
+    }
+    bool Append(const char* text);
+    /// What the readers of a value add when it is bad: for the arrays around it up to the member, and for a
+    /// single one.
+    bool AppendValueWords(const ObjectReaderLevels& levels, size_t nLevels);
+    /// The part of it that arrays add: for one that has no right end.
+    bool AppendArrayWords(const ObjectReaderLevels& levels, size_t nLevels);
+    bool AppendKeyWords(const char* key);
+    void Commit() { wordsM.Commit(); }
+
+ private:
+    /// Beyond this many bytes the outer wrappers are left out: with each byte of input the words can grow by
+    /// 33.
+    static constexpr size_t maxBytesG = 1u << 30;
+
+    ErrorWords wordsM;
+    size_t nByteM = 0;
+    bool isSilentM = false;
+};
+
+}  // namespace sorn

@@ -1,0 +1,114 @@
+#pragma once
+
+#include <cstdint>
+#include <utility>
+
+#include "rox/RoxWorkStack.h"
+#include "rox/ref.h"
+#include "sorn/convert/FieldAccess.h"
+#include "sorn/convert/StructTable.h"
+#include "sorn/dict/LazyBody.h"
+#include "sorn/json/JsonOutput.h"
+#include "sorn/json/StringWriter.h"
+#include "sorn/model/FieldInfo.h"
+#include "sorn/model/OrvoVersion.h"
+#include "sorn/model/SornObject.h"
+#include "sorn/model/StructInfo.h"
+
+namespace sorn {
+
+class Dictionary;
+
+/// The writer of objects straight from the tables to compact text. The fields stand in slot order, and "type"
+/// stands in front of the last slot whose name sorts below it, or behind all fields when there is none. Older
+/// forms of fields are never written. Null references are left out, a single field's with its name; a
+/// repeated field whose elements are all null is an empty list. It keeps its own stack, so that nesting is
+/// bounded by memory alone. The objects must not change meanwhile.
+///
+/// Dictionaries, of any-dict fields and of lazy bodies, it cannot write: it stops before each one, and goes
+/// on behind it when whoever runs it has written the dictionary. What stands in the dictionary may be written
+/// by this same writer meanwhile, above what is open.
+class ObjectWriter {
+ public:
+    /// `pool` takes the stack when it becomes large.
+    ObjectWriter(RoxMempool* pool, StructTable table, JsonOutput& out)
+        : tableM(table), outM(out), framesM(pool) {}
+
+    /// Opens an object, whose struct must be in the table. It is the caller's.
+    void BeginObject(const SornObject& object, OrvoVersion version) { Open(object, version, false); }
+    /// The same with a reference that the writer keeps until the object is written.
+    void BeginBody(const ref<SornObject>& object, OrvoVersion version);
+    /// Opens one field of an object: its name, which is written as it is, and its value or values, as an
+    /// object would have them. `isMulti` stands in for the field's arity, and whether the field is present is
+    /// not asked. A separator goes before it unless `isFirst`, which becomes false. A repeated field without
+    /// elements writes nothing; neither does one of a data type that does not exist, where a single one
+    /// writes its name.
+    void BeginField(const char* name, const FieldInfo& field, bool isMulti, const SornObject& object,
+                    OrvoVersion version, bool& isFirst);
+    /// Writes until no more than `depth` objects and lists are open. False when it stops before a dictionary.
+    bool Run(size_t depth);
+    /// Objects and lists that are open.
+    size_t GetDepth() const { return framesM.Size(); }
+
+    /// The dictionary before which Run has stopped.
+    ref<Dictionary> TakeDictionary() { return std::move(dictionaryM); }
+
+    /// Writes a separator unless `isFirst`, which becomes false, and the name as it is, with what goes
+    /// between a name and its value.
+    static void WriteName(const char* name, size_t nName, bool& isFirst, JsonOutput& out);
+
+ private:
+    /// An object, or the list of references of one of its repeated fields.
+    struct Frame {
+        const StructInfo* pInfo;  // null for a list
+        const SornObject* pObject;
+        const FieldInfo* pField;  // that of a list
+        int32_t next;             // slot, or element
+        int32_t end;              // of the slots in front of "type" and then of all, or of the elements
+        int32_t block;            // the slot of the lowest bit of candidates
+        uint32_t candidates;      // slots before `next` that are to be looked at
+        unsigned lastName;        // bytes of the struct's names in front of the last one
+        OrvoVersion version;
+        bool isFirst;
+        bool isHeld;
+        bool isTypeWritten;
+    };
+
+    void Open(const SornObject& object, OrvoVersion version, bool isHeld);
+    void ContinueObject();
+    void ContinueList();
+    bool WriteSlots(Frame& frame);
+    void WriteType(const StructInfo& info, bool& isFirst);
+    /// These are false when they have opened something, and before a dictionary. No reference is null.
+    bool WriteSingle(const char* name, size_t nName, size_t nReadable, const FieldInfo& field,
+                     const SornObject& object, OrvoVersion version, bool& isFirst);
+    bool WriteMulti(const char* name, size_t nName, const FieldInfo& field, const SornObject& object,
+                    OrvoVersion version, bool& isFirst);
+    bool WriteReference(DataType type, const FieldSource& source, unsigned i, OrvoVersion version);
+    bool WriteLazy(const ref<LazyDict>& body);
+
+    // Values that hold no others; a value is what FieldSource gives for it (ObjectWriterValues.cpp).
+
+    static constexpr size_t maxShortNameG = 200;
+    static constexpr size_t maxShortValueG = stringwriter::maxShortG * stringwriter::maxEscapedG + 2;
+    static_assert(maxShortNameG + maxShortValueG + 6 <= JsonOutput::maxRoomG);
+
+    /// Whether the value is a string that PutShort cannot take.
+    static bool FLong(DataType type, const void* value) {
+        return type == SORN_DATA_TYPE_STRING &&
+               static_cast<const RoxString*>(value)->NByte() > stringwriter::maxShortG;
+    }
+    /// Writes a value that is no reference to memory with room for maxShortValueG bytes; gives the end.
+    unsigned char* PutShort(const FieldInfo& field, const void* value, unsigned char* out) const;
+    unsigned char* PutLongId(const FieldInfo& field, uint64_t id, unsigned char* out) const;
+    unsigned char* PutStringId(const FieldInfo& field, const RoxString& id, unsigned char* out) const;
+    void WriteValue(const FieldInfo& field, const void* value);
+    void WriteBytes(const rox::ByteBuffer& value);
+
+    StructTable tableM;
+    JsonOutput& outM;
+    RoxWorkStack<Frame, 16> framesM;
+    ref<Dictionary> dictionaryM;
+};
+
+}  // namespace sorn
