@@ -1,55 +1,36 @@
 #include "tools/Convert.h"
 
+#include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <cstdio>
 #include <string>
 
 #include "rox/RoxMempool.h"
-#include "sorn/convert/DictionarySornObject.h"
-#include "sorn/dict/Dictionary.h"
-#include "sorn/json/JsonFormat.h"
-#include "sorn/model/Schema.h"
 #include "tools/ExitCode.h"
 #include "tools/LineReader.h"
 #include "tools/Output.h"
 #include "tools/Progress.h"
+#include "tools/RecordForms.h"
 
 namespace sorn::tools {
 
 namespace {
 
-/// Text to dictionary to object to dictionary. A null dictionary and words when the record is refused.
-ref<Dictionary> TakeThroughObject(RoxMempool* pool, const std::string& text, OrvoVersion version,
-                                  RoxString& error) {
-    ref<Dictionary> dictionary = Dictionary::FromJson(reinterpret_cast<const unsigned char*>(text.data()),
-                                                      static_cast<unsigned>(text.size()), error, pool);
-    if (!dictionary) return nullptr;
-    DictionarySornObject converter(pool, Schema::vStructDefG, Schema::nStructDefG);
-    ref<SornObject> object;
-    if (!converter.DictionaryToSornObject(dictionary, version, object, error)) return nullptr;
-    return converter.SornObjectToDictionary(object.get(), version);
-}
-
-/// Writes the record's text and a line feed, and gives true; or gives the words and false. The text goes out
-/// in pieces: pretty text of a deep record is much longer than the record.
+/// Writes the record in its new form and gives true; or gives words and false.
 bool ConvertRecord(const ConvertOptions& options, const std::string& record, std::FILE* out,
                    std::string& words) {
     RoxMempool pool("sorn convert");
-    RoxString error;
-    const ref<Dictionary> result = TakeThroughObject(&pool, record, options.schemaVersion, error);
-    if (!result) {
-        words = std::string(error.View()) + "\n";
-        return false;
-    }
-    FileSink sink(out);
-    result->ToJson(sink, JsonFormat(options.pretty));
-    std::fputc('\n', out);
+    const ref<SornObject> object = ReadRecord(options, &pool, record, words);
+    if (object == nullptr) return false;
+    WriteRecord(options, &pool, object, out);
     return true;
 }
 
 void WriteWords(const std::string& words) {
     std::fwrite(words.data(), 1, words.size(), stderr);
+    std::fputc('\n', stderr);
 }
 
 /// False when a line was refused.
@@ -103,16 +84,28 @@ std::FILE* Open(const std::string& path, const char* mode, std::FILE* standard) 
     return file;
 }
 
+/// The standard output for records alone. The library tells unknown fields of the binary form on the standard
+/// output, which becomes the standard error for that.
+std::FILE* TakeStandardOutput() {
+    const int descriptor = ::fcntl(STDOUT_FILENO, F_DUPFD_CLOEXEC, 3);
+    std::FILE* out = descriptor >= 0 ? ::fdopen(descriptor, "wb") : nullptr;
+    if (out == nullptr || ::dup2(STDERR_FILENO, STDOUT_FILENO) < 0) {
+        std::perror("standard output");
+        return nullptr;
+    }
+    return out;
+}
+
 int ConvertInto(const ConvertOptions& options, std::FILE* in) {
     if (!options.outPath.empty() && FSameFile(options.outPath, in)) {
         std::fprintf(stderr, "%s: is the input, too\n", options.outPath.c_str());
         return WRONG_USAGE;
     }
-    std::FILE* out = Open(options.outPath, "wbe", stdout);
+    std::FILE* out = options.outPath.empty() ? TakeStandardOutput() : Open(options.outPath, "wbe", nullptr);
     if (out == nullptr) return WRONG_USAGE;
     int code = ConvertStream(options, in, out);
-    if (out != stdout && std::fclose(out) != 0) {
-        std::perror(options.outPath.c_str());
+    if (std::fclose(out) != 0) {
+        std::perror(options.outPath.empty() ? "standard output" : options.outPath.c_str());
         code = SOME_REFUSED;
     }
     return code;

@@ -6,9 +6,9 @@ namespace sorn::tools {
 
 /// What "sorn convert" was asked for.
 struct ConvertOptions {
-    std::string from = "json";
-    std::string to = "json";
-    std::string road = "dictionary";
+    std::string from = "json";        ///< "json" or "binary"
+    std::string to = "json";          ///< the same
+    std::string road = "dictionary";  ///< how JSON becomes an object and back: "typed" or "dictionary"
     int schemaVersion = 0;
     bool pretty = false;
     bool lines = false;

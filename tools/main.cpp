@@ -22,24 +22,26 @@ void AddDescribe(CLI::App& app, sorn::tools::DescribeOptions& options) {
 void AddConvert(CLI::App& app, sorn::tools::ConvertOptions& options) {
     CLI::App* command = app.add_subcommand("convert", "Takes a record through its forms and writes it again");
     command->add_option("--from", options.from, "Form of the input")
-        ->check(CLI::IsMember({"json"}))
+        ->check(CLI::IsMember({"json", "binary"}))
         ->capture_default_str();
     command->add_option("--to", options.to, "Form of the output")
-        ->check(CLI::IsMember({"json"}))
+        ->check(CLI::IsMember({"json", "binary"}))
         ->capture_default_str();
     command
         ->add_option("--road", options.road,
-                     "text parser, dictionary to object, object to dictionary, text writer")
-        ->check(CLI::IsMember({"dictionary"}))
+                     "How JSON becomes an object and back: typed, straight, or dictionary, which honours the "
+                     "version and required fields and sorts the names")
+        ->check(CLI::IsMember({"typed", "dictionary"}))
         ->capture_default_str();
     command
         ->add_option("--schema-version", options.schemaVersion,
                      "Schema version to convert at; 0 takes every field")
         ->check(CLI::NonNegativeNumber)
         ->capture_default_str();
-    command->add_flag("--pretty", options.pretty, "Line breaks and indentation");
+    command->add_flag("--pretty", options.pretty, "Line breaks and indentation; the names are sorted then");
     command->add_flag("--lines", options.lines,
-                      "One record on each line; a line that is refused gives an empty line");
+                      "One record on each line, binary ones as Base64; a line that is refused gives an "
+                      "empty line");
     command->add_option("-o,--output", options.outPath, "Output file (default: standard output)")
         ->option_text("OUT");
     command->add_option("IN", options.inPath, "Input file (default: standard input)")->option_text("IN");

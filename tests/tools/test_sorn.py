@@ -31,7 +31,7 @@ class Usage(unittest.TestCase):
             self.assertIn(b"Usage: sorn", out)
 
     def test_wrong_usage(self):
-        for arguments in ([], ["nonsense"], ["convert", "--nonsense"], ["convert", "--from", "yaml"],
+        for arguments in ([], ["nonsense"], ["convert", "--nonsense"], ["convert", "--from", "yaml"], ["convert", "--road", "long"],
                           ["convert", "--schema-version", "-1"], ["convert", "--schema-version", "x"],
                           ["describe", "Recording"], ["describe", "0"], ["describe", "130"], ["describe", "99999999999"],
                           ["describe", "-3"], ["convert", "/nowhere/in.json"], ["convert", "-o", "/nowhere/out.json"]):
@@ -65,7 +65,8 @@ class Usage(unittest.TestCase):
             self.assertEqual(self.completions(command, "--"), options, command)
         self.assertEqual(self.completions("con"), {"convert"})
         self.assertEqual(self.completions("describe", "recordingS"), {"recordingSearch", "recordingSettings"})
-        self.assertEqual(self.completions("convert", "--road", ""), {"dictionary"})
+        self.assertEqual(self.completions("convert", "--road", ""), {"dictionary", "typed"})
+        self.assertEqual(self.completions("convert", "--to", ""), {"json", "binary"})
 
 
 class Describe(unittest.TestCase):
@@ -153,6 +154,55 @@ class Convert(unittest.TestCase):
         self.assertEqual(run("convert", "--schema-version", "43", text=b'{"type":"audioStream"}')[2],
                          b"Unmarshaling to SornObject: given orvo version is out of range used in code generation: \x2b\n")
 
+    # hostAndPort is struct 2045: 2045 * 8 + 2 = 0x3FEA is EA 7F; 8 bytes of fields; "a b" in field 1; 80, zigzag 160, in field 2.
+    BINARY = bytes.fromhex("EA7F 08 0A03612062 10A001")
+    BASE64 = b"6n8ICgNhIGIQoAE=\n"
+    SORTED = b'{"host": "a b", "port": 80, "type": "hostAndPort"}\n'
+    SLOTS = b'{"host": "a b", "type": "hostAndPort", "port": 80}\n'
+
+    def test_all_forms_and_roads(self):
+        for road, text in (("typed", self.SLOTS), ("dictionary", self.SORTED)):
+            for source, given in (("json", self.SORTED), ("json", self.SLOTS), ("binary", self.BINARY)):
+                for target, expected in (("json", text), ("binary", self.BINARY)):
+                    forms = ["convert", "--road", road, "--from", source, "--to", target]
+                    self.assertEqual(run(*forms, text=given), (DONE, expected, b""), forms)
+                    lines = self.BASE64 if source == "binary" else given
+                    expected_line = self.BASE64 if target == "binary" else text
+                    self.assertEqual(run(*forms, "--lines", text=lines * 2), (DONE, expected_line * 2, b""), forms)
+
+    def test_pretty_is_the_dictionary_writers(self):
+        pretty = b'{\n    "host": "a b", \n    "port": 80, \n    "type": "hostAndPort"\n}\n'
+        for source, given in (("json", self.SLOTS), ("binary", self.BINARY)):
+            self.assertEqual(run("convert", "--road", "typed", "--pretty", "--from", source, text=given), (DONE, pretty, b""))
+
+    def test_refused_on_the_typed_road(self):
+        for text, words in (
+                (b"[]", b"JSON object does not start with '{'.\n"),
+                (b"{}", b"the type of the record is missing, or names no struct\n"),
+                (b'{"type": "nope"}', b"the type of the record is missing, or names no struct\n"),
+                (b'{"type": "hostAndPort", "port": "x"}',
+                 b" failed to UnmarshalOneSingleValue in ReadFieldValue Failed to parse value for key port\n")):
+            self.assertEqual(run("convert", "--road", "typed", text=text), (SOME_REFUSED, b"", words), text)
+        # No required field is asked for here, and what stands behind the record is not looked at.
+        self.assertEqual(run("convert", "--road", "typed", text=b'{"type": "hostAndPort"} x')[:2],
+                         (DONE, b'{"host": "", "type": "hostAndPort", "port": 0}\n'))
+
+    def test_refused_binary_records(self):
+        words = b"Protobuf did not unmarshal to SornObject\n"
+        for given in (b"", b"\xEA", self.BINARY[:-1], self.BINARY + b"\0"):
+            self.assertEqual(run("convert", "--from", "binary", text=given), (SOME_REFUSED, b"", words), given)
+        given = self.BASE64 + b"6n8I=\n\n" + self.BASE64.replace(b"\n", b"\r\n") + b"6n8J\n"
+        self.assertEqual(run("convert", "--from", "binary", "--lines", text=given),
+                         (SOME_REFUSED, self.SORTED + b"\n\n" + self.SORTED + b"\n",
+                          b"line 2: the line is not Base64\nline 3: " + words + b"line 5: " + words))
+        self.assertEqual(run("convert", "--to", "binary", "--lines", text=self.SORTED + b"[]\n" + self.SORTED)[:2],
+                         (SOME_REFUSED, self.BASE64 + b"\n" + self.BASE64))
+
+    def test_unknown_fields_are_told_apart_from_the_records(self):
+        given = bytes.fromhex("EA7F 0A 0A03612062 10A001 1801")  # field 3 is one that the struct has not
+        self.assertEqual(run("convert", "--from", "binary", text=given),
+                         (DONE, self.SORTED, b"field number '3' out of range in 'hostAndPort'\n"))
+
     def test_older_version_there_and_back(self):
         text = b'{"audioStreamFormat": "ac3", "audioStreamId": "vuka:aus.7", "type": "audioStream"}\n'
         for version in ("0", "7", "21", "22", "42"):
@@ -167,6 +217,11 @@ class Convert(unittest.TestCase):
         limit = {} if len(TOOL) > 1 else {"preexec_fn": small}  # an emulator needs a stack of its own
         done = subprocess.run([*TOOL, "convert"], input=text, capture_output=True, timeout=300, **limit)
         self.assertEqual((done.returncode, done.stdout == text, done.stderr), (DONE, True, b""))
+        # And through the binary form by the typed road.
+        forms = ["convert", "--road", "typed"]
+        binary = subprocess.run([*TOOL, *forms, "--to", "binary"], input=text, capture_output=True, timeout=300, **limit)
+        done = subprocess.run([*TOOL, "convert", "--from", "binary"], input=binary.stdout, capture_output=True, timeout=300, **limit)
+        self.assertEqual((binary.returncode, done.returncode, done.stdout == text), (DONE, DONE, True))
 
     def test_lines_pretty(self):
         text = b'{"type":"success"}\n{"type":"success"}\n'

@@ -6,8 +6,8 @@ _sorn() {
         return
     fi
     case $previous in
-        --from | --to) mapfile -t COMPREPLY < <(compgen -W 'json' -- "$word"); return ;;
-        --road) mapfile -t COMPREPLY < <(compgen -W 'dictionary' -- "$word"); return ;;
+        --from | --to) mapfile -t COMPREPLY < <(compgen -W 'json binary' -- "$word"); return ;;
+        --road) mapfile -t COMPREPLY < <(compgen -W 'typed dictionary' -- "$word"); return ;;
     esac
     case $command:$word in
         describe:-*) mapfile -t COMPREPLY < <(compgen -W '--json --help --help-all' -- "$word") ;;
