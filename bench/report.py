@@ -1,19 +1,60 @@
 #!/usr/bin/env python3
-"""Prints a table of rates and ratios from the JSON output of the benchmark programs.
+"""Prints a table of rates and ratios from the JSON output of the benchmark programs, and draws the ratios.
 
-Benchmarks are named WORK/DATA/LIBRARY. A rate is the median of the repetitions; a ratio is ours to the peer's.
+usage: report.py [--svg FILE] [--instructions FILE] OUTPUT.json...
+
+Benchmarks are named WORK/DATA/LIBRARY. A rate is the median of the repetitions; a ratio is ours to the peer's, and bigger
+is better. The work "memory" has no rate but bytes, and there the smaller ratio is better. FILE of --instructions is what
+instructions.py wrote.
 """
+import argparse
 import json
 import statistics
 import sys
+from typing import NamedTuple
+
+import chart
 
 OURS = "sorn"
 DATA = ["examples", "5 KiB", "500 KiB", "5 MiB"]
+MEMORY = "memory"
+WORKS = ["object to binary", "binary to object", "object to text", "text to object", "tree to text", "text to tree", MEMORY]
+# The ratio that is wanted, by work and peer; of memory, the highest.
+GOALS = {
+    ("object to binary", "libprotobuf"): 1.5,
+    ("binary to object", "libprotobuf"): 1.5,
+    ("object to binary", "libprotobuf dynamic"): 4,
+    ("binary to object", "libprotobuf dynamic"): 4,
+    ("text to object", "RapidJSON"): 1.0,
+    ("text to object", "libprotobuf"): 10,
+    ("object to text", "RapidJSON"): 1.5,
+    # Shown without a goal of their own.
+    ("object to text", "libprotobuf"): None,
+    ("object to binary", "libprotobuf oneof"): None,
+    ("binary to object", "libprotobuf oneof"): None,
+    (MEMORY, "libprotobuf oneof"): None,
+    ("text to tree", "nlohmann-json"): 3,
+    ("tree to text", "nlohmann-json"): 3,
+    (MEMORY, "libprotobuf"): 1.0,
+}
 
 
-def read_rates(paths):
-    """{(work, data): {library: [bytes per second, ...]}}, in the order of the files."""
-    rates = {}
+class Row(NamedTuple):
+    work: str
+    data: str
+    library: str
+    figure: float  # bytes per second; of memory, bytes
+    ratio: float   # ours to this; None for ours
+    goal: float    # or None
+
+    @property
+    def is_met(self):
+        return self.ratio <= self.goal if self.work == MEMORY else self.ratio >= self.goal
+
+
+def read_figures(paths):
+    """{(work, data): {library: [figure, ...]}}, in the order of the files."""
+    figures = {}
     for path in paths:
         with open(path, encoding="utf-8") as file:
             runs = json.load(file)["benchmarks"]
@@ -22,33 +63,58 @@ def read_rates(paths):
                 sys.exit(f"{run['name']}: {run['error_message']}")
             if run["run_type"] != "iteration":
                 continue
-            work, data, library = run["run_name"].split("/")
-            rates.setdefault((work, data), {}).setdefault(library, []).append(run["bytes_per_second"])
-    return rates
+            work, data, library = run["name"].split("/")[:3]
+            figure = run["bytes"] if work == MEMORY else run["bytes_per_second"]
+            figures.setdefault((work, data), {}).setdefault(library, []).append(figure)
+    return figures
+
+
+def rows_of(figures):
+    rows = []
+    for (work, data), libraries in sorted(figures.items(), key=lambda item: (WORKS.index(item[0][0]), DATA.index(item[0][1]))):
+        medians = {library: statistics.median(values) for library, values in libraries.items()}
+        for library, figure in sorted(medians.items(), key=lambda item: (item[0] != OURS, item[0])):
+            ratio = None if library == OURS or OURS not in medians else medians[OURS] / figure
+            rows.append(Row(work, data, library, figure, ratio, GOALS.get((work, library))))
+    return rows
+
+
+def print_rows(rows):
+    print(f"{'work':<18}{'data':<10}{'library':<21}{'MB/s':>11}{'ours : it':>11}{'goal':>7}")
+    for row in rows:
+        ratio = "" if row.ratio is None else f"{row.ratio:.2f}"
+        goal = ""
+        if row.goal is not None and row.ratio is not None:
+            goal = f"{row.goal:g}".rjust(7) + ("  met" if row.is_met else "  not met")
+        figure = f"{row.figure / 1e3:.1f} kB" if row.work == MEMORY else f"{row.figure / 1e6:.1f}"
+        print(f"{row.work:<18}{row.data:<10}{row.library:<21}{figure:>11}{ratio:>11}{goal}")
+
+
+def print_flatness(path):
+    with open(path, encoding="utf-8") as file:
+        measured = json.load(file)
+    print(f"\ninstructions per byte at {measured['large']} bytes to those at {measured['small']}, limit {measured['limit']}")
+    for result in measured["results"]:
+        verdict = "met" if result["ratio"] <= measured["limit"] else "not met"
+        print(f"{result['shape']:<12}{result['codec']:<18}{result['ratio']:>6.2f}  {verdict}")
 
 
 def main():
-    if len(sys.argv) < 2:
-        sys.exit("usage: report.py OUTPUT.json...")
-    rates = read_rates(sys.argv[1:])
-    print(f"{'work':<14}{'data':<10}{'library':<16}{'MB/s':>9}{'ours : it':>11}")
-    for (work, data), libraries in sorted(rates.items(), key=lambda item: (item[0][0], DATA.index(item[0][1]))):
-        medians = {library: statistics.median(values) for library, values in libraries.items()}
-        for library, rate in sorted(medians.items(), key=lambda item: (item[0] != OURS, item[0])):
-            ratio = "" if library == OURS else f"{medians[OURS] / rate:.2f}"
-            print(f"{work:<14}{data:<10}{library:<16}{rate / 1e6:>9.1f}{ratio:>11}")
-    for work in sorted({work for work, _ in rates}):
-        flat = flatness(rates, work)
-        if flat is not None:
-            print(f"{work}: cost per byte at 5 MiB against 5 KiB, ours: {flat:.2f}")
-
-
-def flatness(rates, work):
-    small = rates.get((work, "5 KiB"), {}).get(OURS)
-    large = rates.get((work, "5 MiB"), {}).get(OURS)
-    if not small or not large:
-        return None
-    return statistics.median(small) / statistics.median(large)
+    parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
+    parser.add_argument("--svg", metavar="FILE", help="draw the ratios there")
+    parser.add_argument("--instructions", metavar="FILE")
+    parser.add_argument("outputs", nargs="+", metavar="OUTPUT.json")
+    options = parser.parse_args()
+    rows = rows_of(read_figures(options.outputs))
+    print_rows(rows)
+    if options.instructions:
+        print_flatness(options.instructions)
+    if options.svg:
+        groups = [chart.Group(f"{work}, against {library}", "at most" if work == MEMORY else "at least", goal,
+                              [(row.data, row.ratio) for row in rows if (row.work, row.library) == (work, library)])
+                  for (work, library), goal in sorted(GOALS.items(), key=lambda item: WORKS.index(item[0][0]))]
+        with open(options.svg, "w", encoding="utf-8") as file:
+            file.write(chart.svg("Speed, ours to the peer's in the same run", [g for g in groups if g.bars]))
 
 
 if __name__ == "__main__":

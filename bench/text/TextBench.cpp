@@ -8,10 +8,10 @@
 
 #include <nlohmann/json.hpp>
 
+#include "common/Bodies.h"
 #include "rox/RoxMempool.h"
 #include "rox/RoxString.h"
 #include "sorn/dict/Dictionary.h"
-#include "text/Bodies.h"
 
 namespace {
 
