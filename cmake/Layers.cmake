@@ -6,6 +6,9 @@ target_compile_options(sorn_flags INTERFACE
     -Wall -Wextra -Wshadow -Wconversion -Wsign-conversion -Wold-style-cast -Wnon-virtual-dtor -Woverloaded-virtual -Werror
     -fno-semantic-interposition)  # calls within a source file go straight, not through the table of the shared object
 
+# What a shared object of ours is linked with: its own calls and tables reach its own functions directly.
+set(SORN_SHARED_LINK_OPTIONS -Wl,-Bsymbolic-functions)
+
 # All sources of the calling directory as one set of objects, which a shared library then takes up.
 function(sorn_layer name)
     cmake_parse_arguments(arg "" "" "BELOW" ${ARGN})

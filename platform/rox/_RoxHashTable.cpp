@@ -65,18 +65,20 @@ uint32_t _RoxHashTable::TagOf(const void* key) const {
 /// The slot in use with that tag for whose key `equal` is true, or noSlot.
 template <class Equal>
 inline unsigned _RoxHashTable::Search(uint32_t tag, Equal equal) const {
+    const uint32_t* const tags = Tags();
     if (!FIndexed()) {
         for (unsigned slot = 0; slot < nSlotM; ++slot) {
-            if (vTagM[slot] == tag && vEntryM[slot] != nullptr && equal(vEntryM[slot]->pKey)) {
+            if (tags[slot] == tag && vEntryM[slot] != nullptr && equal(vEntryM[slot]->pKey)) {
                 return slot;
             }
         }
         return noSlot;
     }
     // Slots of removed entries stay in the index, and at least half of the index is 0.
-    for (uint32_t i = tag & indexMaskM; pIndexM[i] != 0; i = (i + 1) & indexMaskM) {
-        unsigned slot = pIndexM[i] - 1;
-        if (vTagM[slot] == tag && vEntryM[slot] != nullptr && equal(vEntryM[slot]->pKey)) {
+    const uint32_t* const index = Index();
+    for (uint32_t i = tag & indexMaskM; index[i] != 0; i = (i + 1) & indexMaskM) {
+        unsigned slot = index[i] - 1;
+        if (tags[slot] == tag && vEntryM[slot] != nullptr && equal(vEntryM[slot]->pKey)) {
             return slot;
         }
     }
@@ -145,7 +147,7 @@ inline void _RoxHashTable::Put(Entry* entry, uint32_t tag) {
         }
     }
     vEntryM[nSlotM] = entry;
-    vTagM[nSlotM] = tag;
+    Tags()[nSlotM] = tag;
     if (FIndexed()) {
         IndexSlot(nSlotM);
     }
@@ -185,8 +187,6 @@ void _RoxHashTable::Clear() {
     Entry** entries = vEntryM;
     unsigned n = nSlotM;
     vEntryM = nullptr;
-    vTagM = nullptr;
-    pIndexM = nullptr;
     nLiveM = nSlotM = firstSlotM = capacityM = indexMaskM = 0;
     for (unsigned i = 0; fOwnM && i < n; ++i) {
         if (entries[i] != nullptr) {
@@ -228,24 +228,22 @@ void _RoxHashTable::Rebuild(unsigned capacity) {
     uint64_t bytes = uint64_t{capacity} * (sizeof(Entry*) + sizeof(uint32_t)) + nIndex * sizeof(uint32_t);
     RoxAssert(bytes <= SIZE_MAX / 2, "_RoxHashTable: too many entries");
     Entry** oldEntries = vEntryM;
-    const uint32_t* oldTags = vTagM;
+    const uint32_t* oldTags = Tags();
     unsigned nOld = nSlotM;
     void* block = RoxMempool::MallocIn(pMempoolM, static_cast<size_t>(bytes));
     vEntryM = static_cast<Entry**>(block);
-    vTagM = reinterpret_cast<uint32_t*>(vEntryM + capacity);
-    pIndexM = nIndex == 0 ? nullptr : vTagM + capacity;
+    capacityM = capacity;
     indexMaskM = static_cast<uint32_t>(nIndex - (nIndex == 0 ? 0 : 1));
     if (FIndexed()) {
-        memset(pIndexM, 0, static_cast<size_t>(nIndex) * sizeof(uint32_t));
+        memset(Index(), 0, static_cast<size_t>(nIndex) * sizeof(uint32_t));
     }
-    capacityM = capacity;
     nSlotM = firstSlotM = 0;
     for (unsigned i = 0; i < nOld; ++i) {
         if (oldEntries[i] == nullptr) {
             continue;
         }
         vEntryM[nSlotM] = oldEntries[i];
-        vTagM[nSlotM] = fWasIndexed == FIndexed() ? oldTags[i] : TagOf(oldEntries[i]->pKey);
+        Tags()[nSlotM] = fWasIndexed == FIndexed() ? oldTags[i] : TagOf(oldEntries[i]->pKey);
         if (FIndexed()) {
             IndexSlot(nSlotM);
         }
@@ -255,11 +253,12 @@ void _RoxHashTable::Rebuild(unsigned capacity) {
 }
 
 void _RoxHashTable::IndexSlot(unsigned slot) {
-    uint32_t i = vTagM[slot] & indexMaskM;
-    while (pIndexM[i] != 0) {
+    uint32_t* const index = Index();
+    uint32_t i = Tags()[slot] & indexMaskM;
+    while (index[i] != 0) {
         i = (i + 1) & indexMaskM;
     }
-    pIndexM[i] = slot + 1;
+    index[i] = slot + 1;
 }
 
 uint32_t _RoxHashTable::HashRoxStringRepN(const void* key) {

@@ -78,7 +78,11 @@ class _RoxHashTable {
     friend class _RoxHashTableIter;
     static constexpr unsigned noSlot = 0xFFFFFFFF;
 
-    bool FIndexed() const { return pIndexM != nullptr; }
+    bool FIndexed() const { return indexMaskM != 0; }
+    /// By slot: a quick mark of the key, its hash once the table is indexed.
+    uint32_t* Tags() const { return reinterpret_cast<uint32_t*>(vEntryM + capacityM); }
+    /// Open addressing: slot + 1, or 0; only in tables above the linear limit.
+    uint32_t* Index() const { return Tags() + capacityM; }
     bool FStringKeys() const { return pHooksM->hash == &HashRoxStringRepN; }
     uint32_t TagOf(const void* key) const;
     unsigned FindSlot(const void* key) const;
@@ -94,15 +98,12 @@ class _RoxHashTable {
 
     RoxMempool* pMempoolM;
     const Hooks* pHooksM;
-    Entry** vEntryM = nullptr;    // by slot, in order of arrival; null where one was removed
-    uint32_t* vTagM = nullptr;    // by slot: a quick mark of the key, its hash once the table is indexed
-    uint32_t* pIndexM = nullptr;  // open addressing: slot + 1, or 0; only in tables above the linear limit
+    Entry** vEntryM = nullptr;  // by slot, in order of arrival, null where one was removed; tags and index follow
     uint32_t nLiveM = 0;
     uint32_t nSlotM = 0;
-    uint32_t firstSlotM =
-        0;  // no entry before it: walks of a table that is emptied from the front start here
+    uint32_t firstSlotM = 0;  // no entry before it: walks of a table emptied from the front start here
     uint32_t capacityM = 0;
-    uint32_t indexMaskM = 0;
+    uint32_t indexMaskM = 0;  // 0 without an index
     uint32_t initialSizeM;
     RoxLockId lockIdM;
     RoxMempoolUser userM;
