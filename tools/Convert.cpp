@@ -8,6 +8,7 @@
 #include <string>
 
 #include "rox/RoxMempool.h"
+#include "sorn/model/Schema.h"
 #include "tools/ExitCode.h"
 #include "tools/LineReader.h"
 #include "tools/Output.h"
@@ -84,8 +85,8 @@ std::FILE* Open(const std::string& path, const char* mode, std::FILE* standard) 
     return file;
 }
 
-/// The standard output for records alone. The library tells unknown fields of the binary form on the standard
-/// output, which becomes the standard error for that.
+/// The standard output for records alone: the library tells unknown fields of the binary form on the standard
+/// output, which becomes the standard error for that, line by line. Null and words on failure.
 std::FILE* TakeStandardOutput() {
     const int descriptor = ::fcntl(STDOUT_FILENO, F_DUPFD_CLOEXEC, 3);
     std::FILE* out = descriptor >= 0 ? ::fdopen(descriptor, "wb") : nullptr;
@@ -93,6 +94,7 @@ std::FILE* TakeStandardOutput() {
         std::perror("standard output");
         return nullptr;
     }
+    std::setvbuf(stdout, nullptr, _IOLBF, 0);
     return out;
 }
 
@@ -101,7 +103,9 @@ int ConvertInto(const ConvertOptions& options, std::FILE* in) {
         std::fprintf(stderr, "%s: is the input, too\n", options.outPath.c_str());
         return WRONG_USAGE;
     }
-    std::FILE* out = options.outPath.empty() ? TakeStandardOutput() : Open(options.outPath, "wbe", nullptr);
+    std::FILE* const standard = TakeStandardOutput();
+    if (standard == nullptr) return SOME_REFUSED;
+    std::FILE* const out = Open(options.outPath, "wbe", standard);
     if (out == nullptr) return WRONG_USAGE;
     int code = ConvertStream(options, in, out);
     if (std::fclose(out) != 0) {
@@ -111,9 +115,22 @@ int ConvertInto(const ConvertOptions& options, std::FILE* in) {
     return code;
 }
 
+/// Whether the options go together; words if not. The dictionary road tells for each record what is wrong
+/// with a version, and the typed road would leave out every field.
+bool FCheck(const ConvertOptions& options) {
+    const int version = options.schemaVersion;
+    const bool isKnown =
+        version == 0 || (version >= Schema::firstSchemaVersionG && version <= Schema::lastSchemaVersionG);
+    if (isKnown || options.road != "typed") return true;
+    std::fprintf(stderr, "--schema-version: the schema has the versions %d to %d\n",
+                 static_cast<int>(Schema::firstSchemaVersionG), static_cast<int>(Schema::lastSchemaVersionG));
+    return false;
+}
+
 }  // namespace
 
 int Convert(const ConvertOptions& options) {
+    if (!FCheck(options)) return WRONG_USAGE;
     std::FILE* in = Open(options.inPath, "rbe", stdin);
     if (in == nullptr) return WRONG_USAGE;
     const int code = ConvertInto(options, in);

@@ -1,6 +1,22 @@
 #include "tools/Output.h"
 
+#include <cstring>
+
 namespace sorn::tools {
+
+unsigned FileSink::Write(const void* bytes, unsigned count) {
+    const char* p = static_cast<const char*>(bytes);
+    const char* const end = p + count;
+    while (asOneLineM && p < end) {
+        const auto* const feed = static_cast<const char*>(std::memchr(p, '\n', static_cast<size_t>(end - p)));
+        if (feed == nullptr) break;
+        std::fwrite(p, 1, static_cast<size_t>(feed - p), pFileM);
+        std::fputc(' ', pFileM);
+        p = feed + 1;
+    }
+    std::fwrite(p, 1, static_cast<size_t>(end - p), pFileM);
+    return std::ferror(pFileM) == 0 ? count : 0;
+}
 
 bool FinishOutput(std::FILE* file) {
     if (std::fflush(file) == 0 && std::ferror(file) == 0) return true;

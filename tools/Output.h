@@ -9,13 +9,13 @@ namespace sorn::tools {
 /// Writes to an open file, which stays the caller's. What could not be written shows at FinishOutput.
 class FileSink final : public kelbaselib::Bytesink {
  public:
-    explicit FileSink(std::FILE* file) : pFileM(file) {}
-    unsigned Write(const void* bytes, unsigned count) override {
-        return static_cast<unsigned>(std::fwrite(bytes, 1, count, pFileM));
-    }
+    /// With `asOneLine` line feeds become blanks.
+    FileSink(std::FILE* file, bool asOneLine) : pFileM(file), asOneLineM(asOneLine) {}
+    unsigned Write(const void* bytes, unsigned count) override;
 
  private:
     std::FILE* pFileM;
+    bool asOneLineM;
 };
 
 /// Flushes. False, and words on standard error, when anything since the file was opened could not be written.

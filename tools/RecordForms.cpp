@@ -98,12 +98,13 @@ void WriteRecord(const ConvertOptions& options, RoxMempool* pool, const ref<Sorn
         WriteBinary(pool, object, options.lines, out);
         return;
     }
+    // A body of text goes out as it came in, line feeds included.
+    FileSink sink(out, options.lines && !options.pretty);
     if (options.road == "typed" && !options.pretty) {
         ByteBuffer text(pool);
         JsonSornObject(pool).SornObjectToJson(object.get(), options.schemaVersion, text);
-        std::fwrite(text.GetData(), 1, text.GetLength(), out);
+        sink.Write(text.GetData(), text.GetLength());
     } else {
-        FileSink sink(out);
         DictionarySornObject(pool, Schema::vStructDefG, Schema::nStructDefG)
             .SornObjectToDictionary(object.get(), options.schemaVersion)
             ->ToJson(sink, JsonFormat(options.pretty));

@@ -1,5 +1,7 @@
 // Every representation to every form: one row a body of the same contents, one test a form.
+#include <atomic>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "convert/ConvertFixture.h"
@@ -332,6 +334,44 @@ TEST_F(ConversionsTest, FailuresToProtobufAreErrorObjects) {
         EXPECT_EQ(Text(back->GetString("type", 0)), "error");
         EXPECT_EQ(Text(back->GetString("text", 0)), Text(lazy->ToDict()->GetString("text", 0)));
     }
+}
+
+TEST_F(ConversionsTest, WordsThatAreThereDoNotMakeAReadableStreamUnreadable) {
+    RoxString error("old;");
+    EXPECT_NE(OfStream(sortedG)->ToSornObjectOrErrorString(error), nullptr);
+}
+
+TEST_F(ConversionsTest, WordsThatEndInANulKeepIt) {
+    // The low byte of a version out of range is a byte of the words: 256 ends in a NUL.
+    const ref<LazyDict> lazy = LazyDict::FromDictionary(&pool, Parse(sortedG), 256);
+    const ref<Dict> error = LazyDict::FromBytestring(&pool, lazy->ToProtobuf(), 0)->ToDict();
+    const std::string words =
+        "Unmarshaling to SornObject: given orvo version is out of range used in code generation: ";
+    EXPECT_EQ(Text(error->GetString("text", 0)), words + std::string(1, '\0') + "Dict did not unmarshal");
+}
+
+TEST_F(ConversionsTest, ManyThreadsReadOneBody) {
+    // Each representation but a stream, whose queries change it; the pool is shared.
+    Bodies();
+    bodies.pop_back();
+    RoxFeatures::SetEnabled(VK_FEATURE_TYPED_JSON, true);
+    std::vector<std::thread> threads;
+    std::atomic<unsigned> nGood{0};
+    for (unsigned i = 0; i < 4; ++i) {
+        threads.emplace_back([this, &nGood] {
+            for (unsigned round = 0; round < 50; ++round) {
+                for (const auto& [name, lazy] : bodies) {
+                    const bool isGood = Text(lazy->ToDict()->ToString(false)) == sortedG &&
+                                        Bytes(lazy->ToProtobuf()) == binaryG &&
+                                        Text(lazy->ToJson(false)) == CompactOf(lazy) &&
+                                        Json(lazy->ToSornObjectOrError()) == sortedG;
+                    nGood += isGood ? 1 : 0;
+                }
+            }
+        });
+    }
+    for (std::thread& thread : threads) thread.join();
+    EXPECT_EQ(nGood.load(), 4u * 50 * 5);
 }
 
 TEST_F(ConversionsTest, AStreamIsReadThroughSourcesOfItsOwn) {

@@ -4,6 +4,7 @@
 #include <string>
 
 #include "convert/ConvertFixture.h"
+#include "kelbaselib/ByteCountingBytesink.h"
 #include "lazy/TextSource.h"
 #include "rox/VkCast.h"
 #include "sorn/dict/ByteBuffer.h"
@@ -255,6 +256,16 @@ TEST_F(LazyDictTest, AnUnknownRepresentation) {
     RoxString error("old;");
     EXPECT_EQ(lazy->ToSornObjectOrErrorString(error), nullptr);
     EXPECT_EQ(Text(error), "unknown rep in LazyDict");
+    EXPECT_EQ(Context().SornObjectToDictionary(lazy->ToSornObjectOrError().get(), 0)->GetString("text"),
+              RoxString("unknown rep in LazyDict"));
+    ref<SornObject> object = EveryTypeCompanion::Factory(&pool);
+    EXPECT_FALSE(lazy->ToSornObject(object));
+    EXPECT_EQ(object, nullptr);
+    EXPECT_TRUE(lazy->ToJsonBytestring(false)->FEmpty());
+    kelbaselib::ByteCountingBytesink sink;
+    lazy->ToJsonBytesink(sink, false);
+    EXPECT_EQ(sink.GetWrittenBytes(), 0u);
+    EXPECT_TRUE(*lazy == *lazy);
     unsigned structId = 1;
     RoxString name("old");
     EXPECT_FALSE(lazy->GetType(&structId));

@@ -1,6 +1,7 @@
 """The sorn command from outside: what it prints, where, and what it exits with. The command to run (with an emulator in
 front of it on a cross build) comes in SORN_TOOL."""
 
+import base64
 import json
 import os
 import pty
@@ -200,8 +201,34 @@ class Convert(unittest.TestCase):
 
     def test_unknown_fields_are_told_apart_from_the_records(self):
         given = bytes.fromhex("EA7F 0A 0A03612062 10A001 1801")  # field 3 is one that the struct has not
-        self.assertEqual(run("convert", "--from", "binary", text=given),
-                         (DONE, self.SORTED, b"field number '3' out of range in 'hostAndPort'\n"))
+        words = b"field number '3' out of range in 'hostAndPort'\n"
+        self.assertEqual(run("convert", "--from", "binary", text=given), (DONE, self.SORTED, words))
+        with tempfile.TemporaryDirectory() as folder:
+            target = Path(folder, "out.json")
+            self.assertEqual(run("convert", "--from", "binary", "-o", str(target), text=given), (DONE, b"", words))
+            self.assertEqual(target.read_bytes(), self.SORTED)
+        # Told before what is said of the next line.
+        lines = base64.b64encode(given) + b"\n!\n" + base64.b64encode(given) + b"\n"
+        self.assertEqual(run("convert", "--from", "binary", "--lines", text=lines)[2],
+                         words + b"line 2: the line is not Base64\n" + words)
+
+    def test_a_record_is_one_line_whatever_its_bodies_are(self):
+        # orvoRpcResponse is struct 976: 976 * 8 + 2 = 0x1E82 is 82 3D. Field 2, the body, is text with line feeds.
+        body = b'{"type":\n"success"\n}'
+        record = bytes.fromhex("823D") + bytes([len(body) + 2, 0x12, len(body)]) + body
+        for road in ("typed", "dictionary"):
+            code, out, err = run("convert", "--road", road, "--from", "binary", "--lines", text=base64.b64encode(record) * 1 + b"\n")
+            self.assertEqual((code, err, out.count(b"\n")), (DONE, b"", 1), road)
+            self.assertIn(b'{"type": "success" }', out)
+
+    def test_versions_on_the_typed_road(self):
+        text = b'{"type":"ttsSettings","enabled":true,"isFeatureEnabled":true}'
+        for version, expected in (("0", b'{"enabled": true, "type": "ttsSettings", "isFeatureEnabled": true}\n'),
+                                  ("7", b'{"type": "ttsSettings", "enabled": true}\n')):
+            self.assertEqual(run("convert", "--road", "typed", "--schema-version", version, text=text), (DONE, expected, b""))
+        for version in ("6", "43"):
+            self.assertEqual(run("convert", "--road", "typed", "--schema-version", version, text=text),
+                             (WRONG_USAGE, b"", b"--schema-version: the schema has the versions 7 to 42\n"))
 
     def test_older_version_there_and_back(self):
         text = b'{"audioStreamFormat": "ac3", "audioStreamId": "vuka:aus.7", "type": "audioStream"}\n'

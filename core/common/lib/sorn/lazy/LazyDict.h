@@ -95,7 +95,8 @@ class LazyDict final : public RoxCore {
 
     /// Appends the text.
     void ToJsonByteBuffer(ByteBuffer& out, bool pretty) const;
-    /// Hands the text to the sink and stops in silence when it takes nothing more. With the feature
+    /// Hands the text to the sink: JSON bytes in one write, whose answer is not looked at, and other text in
+    /// pieces until the sink takes nothing more, which ends it in silence. With the feature
     /// VK_FEATURE_TYPED_JSON off, objects and the binary form go through a dictionary even when compact: this
     /// differs from the other operations, and users count on it.
     void ToJsonBytesink(kelbaselib::Bytesink& out, bool pretty) const;
@@ -109,7 +110,8 @@ class LazyDict final : public RoxCore {
     /// Reads the whole of a REP_BYTESOURCE body by a source of its own into `out`, which holds a part of the
     /// body when that fails. RoxAssertFail for a body of another representation or without its source.
     bool GetDictionaryFromBytesource(ref<Dictionary>& out) const;
-    /// Makes a REP_BYTESOURCE body a REP_DICTIONARY one, if it can be read, and releases its source.
+    /// Makes a REP_BYTESOURCE body a REP_DICTIONARY one, if it can be read, and releases its source. Does
+    /// nothing to a body without a source.
     void BuildDictionaryFromBytesource();
 
     /// Equal contents, whatever the representations: both sides through ToDict, compared as Dict::operator==

@@ -2,6 +2,7 @@
 #include "rox/RoxAssert.h"
 #include "sorn/binary/ProtoBuf.h"
 #include "sorn/convert/DictionarySornObject.h"
+#include "sorn/dict/ByteBuffer.h"
 #include "sorn/dict/Dict.h"
 #include "sorn/dict/Dictionary.h"
 #include "sorn/dict/MempoolNew.h"
@@ -51,8 +52,10 @@ ref<rox::ByteBuffer> LazyDict::ToProtobuf() const {
         RoxString error;
         object = ObjectOfDictionary(ToDictionaryOrError(), error);
         if (object == nullptr) {
-            object =
-                NewErrorObject(RoxString::Format(GetMempool(), "%sDict did not unmarshal", error.Utf8()));
+            ByteBuffer words(GetMempool());
+            words.AppendText(error);  // may have a NUL inside
+            words.AppendLiteral("Dict did not unmarshal");
+            object = NewErrorObject(words.ToRoxString(GetMempool()));
         }
     }
     return ProtoBuf(GetMempool(), Schema::vStructDefG, Schema::nStructDefG).MarshalKnownDict(object.get());
@@ -69,6 +72,7 @@ bool LazyDict::GetDictionaryFromBytesource(ref<Dictionary>& out) const {
 }
 
 void LazyDict::BuildDictionaryFromBytesource() {
+    // The part of a body that cannot be read is not kept: a later query would take it for the body.
     ref<Dictionary> dictionary;
     if (dictionaryM != nullptr || bytesourceM == nullptr || !GetDictionaryFromBytesource(dictionary)) return;
     dictionaryM = dictionary;
@@ -93,8 +97,11 @@ ref<SornObject> LazyDict::Decode() const {
 ref<Dictionary> LazyDict::ReadBytesource(RoxString& error) const {
     kelbaselib::Bytesource* const source = bytesourceM != nullptr ? bytesourceM->NewSource() : nullptr;
     if (source == nullptr) return nullptr;
-    const ref<Dictionary> dictionary = Dictionary::FromJsonBytesource(source, error, GetMempool());
-    return error.FEmpty() ? dictionary : nullptr;
+    RoxString words;
+    const ref<Dictionary> dictionary = Dictionary::FromJsonBytesource(source, words, GetMempool());
+    if (words.FEmpty()) return dictionary;
+    error = words;
+    return nullptr;
 }
 
 ref<Dictionary> LazyDict::ToDictionaryOrError() const {
