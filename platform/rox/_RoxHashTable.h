@@ -98,7 +98,8 @@ class _RoxHashTable {
 
     RoxMempool* pMempoolM;
     const Hooks* pHooksM;
-    Entry** vEntryM = nullptr;  // by slot, in order of arrival, null where one was removed; tags and index follow
+    Entry** vEntryM =
+        nullptr;  // by slot, in order of arrival, null where one was removed; tags and index follow
     uint32_t nLiveM = 0;
     uint32_t nSlotM = 0;
     uint32_t firstSlotM = 0;  // no entry before it: walks of a table emptied from the front start here

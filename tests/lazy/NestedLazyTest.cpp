@@ -148,7 +148,7 @@ TEST_F(NestedLazyTest, ABodyOfTextInsideABodyInsideABody) {
               "}");
 }
 
-TEST_F(NestedLazyTest, TheIndentationComesBackBehindABody) {
+TEST_F(NestedLazyTest, TheIndentationComesBackBehindABodyAndUnreadableOnesAreLeftOut) {
     const ref<Dictionary> inner = Parse(R"({"k": 1})");
     const ref<ArrayValue> list(new (&pool) ArrayValue(&pool));
     list->Add(LazyDict::FromDictionary(&pool, inner, 0));
@@ -157,13 +157,13 @@ TEST_F(NestedLazyTest, TheIndentationComesBackBehindABody) {
     list->Add(inner);
     const ref<Dictionary> outer(new (&pool) Dictionary(&pool));
     outer->Add(RoxString("list"), list);
+    outer->Add(RoxString("alone"), LazyDict::FromJsonString(&pool, RoxString("{"), 0));
     const std::string expected =
         "{\n"
         "    \"list\": [\n"
         "        {\n"
         "    \"k\": 1\n"
         "}, \n"
-        "        , \n"
         "        null, \n"
         "        {\n"
         "            \"k\": 1\n"

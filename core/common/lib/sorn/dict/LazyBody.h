@@ -28,6 +28,8 @@ struct LazyBodyContent {
     ref<rox::ByteBuffer> text;   ///< these bytes are the text
     ref<SornObject> object;      ///< the text is the typed writer's one of this object at `version`
     OrvoVersion version;
+
+    bool FNothing() const { return dictionary == nullptr && text == nullptr && object == nullptr; }
 };
 
 /// LazyDict::FromDictionary.

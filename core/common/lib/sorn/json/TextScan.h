@@ -91,16 +91,23 @@ inline const unsigned char* FindBareEnd(const unsigned char* p, const unsigned c
     return p;
 }
 
+#if defined(__SSE2__)
+/// A bit for each of the 16 bytes at p that is a double quote, a backslash or a NUL.
+inline unsigned StringStops(const unsigned char* p) {
+    const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(p));
+    const __m128i stops = _mm_or_si128(
+        _mm_or_si128(_mm_cmpeq_epi8(bytes, _mm_set1_epi8('"')), _mm_cmpeq_epi8(bytes, _mm_set1_epi8('\\'))),
+        _mm_cmpeq_epi8(bytes, _mm_setzero_si128()));
+    return static_cast<unsigned>(_mm_movemask_epi8(stops));
+}
+#endif
+
 /// The first double quote, backslash or NUL from p on, or `end`.
 inline const unsigned char* FindStringStop(const unsigned char* p, const unsigned char* end) {
 #if defined(__SSE2__)
     for (; end - p >= 16; p += 16) {
-        const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(p));
-        const __m128i stops = _mm_or_si128(_mm_or_si128(_mm_cmpeq_epi8(bytes, _mm_set1_epi8('"')),
-                                                        _mm_cmpeq_epi8(bytes, _mm_set1_epi8('\\'))),
-                                           _mm_cmpeq_epi8(bytes, _mm_setzero_si128()));
-        const int mask = _mm_movemask_epi8(stops);
-        if (mask != 0) return p + __builtin_ctz(static_cast<unsigned>(mask));
+        const unsigned mask = StringStops(p);
+        if (mask != 0) return p + __builtin_ctz(mask);
     }
 #endif
     for (; end - p >= 8; p += 8) {

@@ -46,6 +46,22 @@ bool ValueWriter::Run(size_t depth) {
 }
 
 bool ValueWriter::Begin(const DictValue& value) {
+    return !FPrepare(value) || BeginPrepared(value);
+}
+
+/// Fetches what a lazy body's text is made of. False when that is nothing: whatever stands around the value
+/// is not written then either.
+bool ValueWriter::FPrepare(const DictValue& value) {
+    if (value.GetTag() != dictvalue::LAZY_DICT) [[likely]]
+        return true;
+    // Null values share the tag.
+    const LazyDictValue* const lazy = VkCast<LazyDictValue>(const_cast<DictValue*>(&value));
+    if (lazy == nullptr || lazy->GetValue() == nullptr) return true;
+    contentM = LazyBodyToWrite(lazy->GetValue(), formatM.isPretty, outM.FSink());
+    return !contentM.FNothing();
+}
+
+bool ValueWriter::BeginPrepared(const DictValue& value) {
     switch (value.GetTag()) {
         case dictvalue::STRING: {
             const StringValue& text = static_cast<const StringValue&>(value);
@@ -59,28 +75,26 @@ bool ValueWriter::Begin(const DictValue& value) {
             BeginDictionary(static_cast<const Dictionary&>(value));
             return false;
         default:
-            return BeginNullOrLazy(value);
+            return BeginNullOrLazy();
     }
 }
 
-bool ValueWriter::BeginNullOrLazy(const DictValue& value) {
-    // The two classes share their tag.
-    const LazyDictValue* const lazy = VkCast<LazyDictValue>(const_cast<DictValue*>(&value));
-    if (lazy == nullptr || lazy->GetValue() == nullptr) {
+bool ValueWriter::BeginNullOrLazy() {
+    const LazyBodyContent content = std::exchange(contentM, LazyBodyContent());
+    if (content.FNothing()) {
         outM.Literal("null");
         return true;
     }
-    LazyBodyContent content = LazyBodyToWrite(lazy->GetValue(), formatM.isPretty, outM.FSink());
     if (content.dictionary != nullptr) {
         BeginBody(content.dictionary);
         return false;
     }
     if (content.object != nullptr) {
-        objectM = std::move(content.object);
+        objectM = content.object;
         objectVersionM = content.version;
         return false;
     }
-    if (content.text != nullptr) outM.Bytes(content.text->GetData(), content.text->GetLength());
+    outM.Bytes(content.text->GetData(), content.text->GetLength());
     return true;
 }
 
@@ -120,14 +134,14 @@ void ValueWriter::ContinueArray() {
         const DictValue* const element = frame.array->At(frame.next++);
         if (frame.next < frame.count) Prefetch(frame.array->At(frame.next));
         if (frame.next + 1 < frame.count) __builtin_prefetch(frame.array->At(frame.next + 1));
-        if (element == nullptr) continue;
+        if (element == nullptr || !FPrepare(*element)) continue;
         if (frame.isBehindFirst) {
             outM.Literal(", ");
             NewLine();
         }
         frame.isBehindFirst = true;
         Indent();
-        if (!Begin(*element)) return;
+        if (!BeginPrepared(*element)) return;
     }
     End(']');
 }
@@ -157,13 +171,14 @@ void ValueWriter::ContinueDictionary() {
 
 /// As Begin.
 bool ValueWriter::WriteMember(Frame& frame, const DictionaryEntries::Name& name, const DictValue& value) {
+    if (!FPrepare(value)) return true;
     if (frame.isBehindFirst) outM.Literal(", ");
     frame.isBehindFirst = true;
     NewLine();
     Indent();
     stringwriter::WriteQuoted(name.Utf8(), name.NByte(), outM);
     outM.Literal(": ");
-    return Begin(value);
+    return BeginPrepared(value);
 }
 
 void ValueWriter::End(char bracket) {

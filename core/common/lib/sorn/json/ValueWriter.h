@@ -18,7 +18,8 @@ class SornObject;
 
 /// The writer of values. It keeps its own stack, so that nesting is bounded by memory alone, that of lazy
 /// bodies in lazy bodies included. A lazy body begins again at indentation 0. Null references in arrays and
-/// under names are left out, with no stray separator. The tree must not change meanwhile.
+/// under names are left out, with no stray separator, and so are lazy bodies that cannot be read. The tree
+/// must not change meanwhile.
 ///
 /// Objects in lazy bodies it cannot write: it stops before each one, and goes on behind it when whoever runs
 /// it has written the object. What stands in the object may be written by this same writer meanwhile, above
@@ -59,7 +60,9 @@ class ValueWriter {
         int32_t outerLevel;
     };
 
-    bool BeginNullOrLazy(const DictValue& value);
+    bool FPrepare(const DictValue& value);
+    bool BeginPrepared(const DictValue& value);
+    bool BeginNullOrLazy();
     void EndBody();
     void BeginArray(const ArrayValue& array);
     void BeginDictionary(const Dictionary& dictionary);
@@ -80,6 +83,7 @@ class ValueWriter {
     RoxWorkStack<Frame, 16> framesM;
     RoxWorkStack<DictionaryEntries::Name, 64> namesM;  // those of all open dictionaries, sorted
     RoxWorkStack<Body, 4> bodiesM;
+    LazyBodyContent contentM;  // of the lazy body that is written next
     ref<SornObject> objectM;
     OrvoVersion objectVersionM;
 };
