@@ -303,6 +303,36 @@ TEST(JsonParser, DictStack) {
     // The destructor frees the node that is left; the leak checker looks.
 }
 
+TEST(JsonParser, AStackOfManyBlocks) {
+    RoxMempool pool("test");
+    const ref<Dictionary> map = Dictionary::New(&pool, "");
+    const ref<sorn::ArrayValue> array(new (&pool) sorn::ArrayValue);
+    JsonParser::DictStack stack;
+    nonRef<DictValue> value;
+    JsonParser::State state = JsonParser::STATE_NONE;
+    for (const unsigned n : {509u, 510u, 511u, 2000u}) {
+        for (unsigned i = 0; i < n; ++i) {
+            const bool isMap = i % 3 == 0;
+            stack.Push(nonRef<DictValue>(isMap ? static_cast<DictValue*>(map.get()) : array.get()),
+                       isMap ? JsonParser::STATE_MAP : JsonParser::STATE_ARRAY);
+        }
+        for (unsigned i = n; i-- > 0;) {
+            ASSERT_TRUE(stack.Pop(value, state));
+            ASSERT_EQ(state, i % 3 == 0 ? JsonParser::STATE_MAP : JsonParser::STATE_ARRAY);
+            ASSERT_EQ(value.Get(), i % 3 == 0 ? static_cast<DictValue*>(map.get()) : array.get());
+        }
+        EXPECT_TRUE(stack.IsEmpty());
+    }
+}
+
+TEST(JsonParser, ConstantsAreTheDescribedOnes) {
+    EXPECT_STREQ(JsonParser::ErrorMessageJsonIsNotAMap, "The JSON must start with a '{' character");
+    // Numbers come as their text: yajl converts none.
+    EXPECT_TRUE(JsonParser::CALLBACKS.yajl_integer == nullptr);
+    EXPECT_TRUE(JsonParser::CALLBACKS.yajl_double == nullptr);
+    EXPECT_TRUE(JsonParser::CALLBACKS.yajl_number != nullptr);
+}
+
 TEST(JsonParser, NumbersOfStates) {
     EXPECT_EQ(int{JsonParser::STATE_NONE}, 0);
     EXPECT_EQ(int{JsonParser::STATE_MAP}, 1);

@@ -4,6 +4,7 @@
 
 #include "rox/RoxAssert.h"
 #include "rox/RoxMempool.h"
+#include "sorn/dict/DictValue.h"
 
 namespace sorn {
 
@@ -143,15 +144,23 @@ void JsonParser::Free(void* context, void* p) {
 }
 
 JsonParser::DictStack::~DictStack() {
-    nonRef<DictValue> value;
-    State state = STATE_NONE;
-    while (Pop(value, state)) {
+    while (pTopM != nullptr) {
+        Block* const block = pTopM;
+        pTopM = block->pBelow;
+        RoxMempool::FreeIn(nullptr, block);
     }
 }
 
 bool JsonParser::DictStack::Push(nonRef<DictValue> value, State state) {
     if (!value) return false;
-    pTopM = ::new (RoxMempool::MallocIn(nullptr, sizeof(Node))) Node{state, value, pTopM};
+    static_assert(alignof(DictValue) > stateMaskG);
+    if (pTopM == nullptr || pTopM->nNodes == nNodesG) {
+        Block* const block = static_cast<Block*>(RoxMempool::MallocIn(nullptr, sizeof(Block)));
+        block->pBelow = pTopM;
+        block->nNodes = 0;
+        pTopM = block;
+    }
+    pTopM->vNode[pTopM->nNodes++] = reinterpret_cast<Node>(value.Get()) | static_cast<Node>(state);
     return true;
 }
 
@@ -161,21 +170,22 @@ bool JsonParser::DictStack::Peek(nonRef<DictValue>& value, State& state) const {
 
 bool JsonParser::DictStack::PeekDictValue(nonRef<DictValue>& value) const {
     if (pTopM == nullptr) return false;
-    value = pTopM->value;
+    value = reinterpret_cast<DictValue*>(Top() & ~stateMaskG);
     return true;
 }
 
 bool JsonParser::DictStack::PeekState(State& state) const {
     if (pTopM == nullptr) return false;
-    state = pTopM->state;
+    state = static_cast<State>(Top() & stateMaskG);
     return true;
 }
 
 bool JsonParser::DictStack::Pop(nonRef<DictValue>& value, State& state) {
     if (!Peek(value, state)) return false;
-    Node* const node = pTopM;
-    pTopM = node->pNext;
-    RoxMempool::FreeIn(nullptr, node);
+    if (--pTopM->nNodes != 0) return true;
+    Block* const block = pTopM;
+    pTopM = block->pBelow;
+    RoxMempool::FreeIn(nullptr, block);
     return true;
 }
 

@@ -3,6 +3,7 @@
 #include <yajl/yajl_parse.h>
 
 #include <cstddef>
+#include <cstdint>
 
 #include "rox/RoxString.h"
 #include "rox/nonRef.h"
@@ -32,7 +33,8 @@ class JsonParser {
     enum State { STATE_NONE = 0, STATE_MAP = 1, STATE_ARRAY = 2 };
 
     /// The open containers, the innermost on top. It holds no reference on them: their parents and the
-    /// caller's result do. The nodes lie on the general heap.
+    /// caller's result do. The nodes lie on the general heap, many to a block, for a text may open a
+    /// container with every byte.
     class DictStack {
      public:
         DictStack() = default;
@@ -50,12 +52,18 @@ class JsonParser {
         bool IsEmpty() const { return pTopM == nullptr; }
 
      private:
-        struct Node {
-            State state;
-            nonRef<DictValue> value;
-            Node* pNext;
+        /// A container's address with its state in the low bits, which an address has free.
+        using Node = uintptr_t;
+        static constexpr Node stateMaskG = 3;
+        static constexpr unsigned nNodesG = 510;
+        struct Block {
+            Block* pBelow;
+            unsigned nNodes;  // never 0
+            Node vNode[nNodesG];
         };
-        Node* pTopM = nullptr;
+        Node Top() const { return pTopM->vNode[pTopM->nNodes - 1]; }
+
+        Block* pTopM = nullptr;
     };
 
     /// The pool must not be null and must outlive the parser.
@@ -70,8 +78,10 @@ class JsonParser {
     void BeginParse(ref<Dictionary>& result);
     /// Begins a check of the syntax alone: no value is built, and the top may be any value.
     void BeginParse();
-    /// Feeds a chunk of any size. False when the text is refused so far, and on every later call; inside a
-    /// long string that may come as many bytes late as the string has up to there.
+    /// Feeds a chunk of any size. False when the text is refused so far, and on every later call. Bytes
+    /// inside of a token that the chunks before have begun, a string, a number or a word, may wait until they
+    /// are as many as the token had up to there: a refusal among them comes that late, at the end of the
+    /// parse at the latest.
     bool ParseChunk(const char* data, size_t size);
     /// Ends the parse: whether the text is whole and right. May be called again, with the same answer.
     bool EndParse();
@@ -81,10 +91,12 @@ class JsonParser {
     /// Gives the memory of those words back to the pool: for those who do not want to leave them there.
     void DropErrorMessage();
 
- private:
+    /// What yajl calls for each event, in its order; null where it is to do without.
     static const yajl_callbacks CALLBACKS;
+    /// "The JSON must start with a '{' character"; yajl's own words about such a text replace it.
     static const char ErrorMessageJsonIsNotAMap[];
 
+ private:
     static void* Malloc(void* context, size_t size);
     static void* Realloc(void* context, void* p, size_t size);
     static void Free(void* context, void* p);

@@ -2,13 +2,14 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 
 #include "rox/RoxString.h"
 
 namespace sorn {
 
-/// Texts of keys that came lately, so that a key which comes again shares one representation, and its hash. A
-/// key that another one has put out of its place is made anew: a cache, not an index.
+/// KeyCache for a parse whose keys come as copies: it holds the texts itself, since the tree of a stream may
+/// lose what was built before the parse ends.
 class KeyTexts {
  public:
     RoxString Get(RoxMempool* pool, const unsigned char* bytes, uint32_t n) {
