@@ -1,4 +1,4 @@
-// What a reading may spend on objects. Invariant for untrusted input: 4.
+// What a reading may spend on objects. Invariant for untrusted input: 11.
 
 #include "sorn/convert/ObjectBudget.h"
 
@@ -34,14 +34,14 @@ TEST_F(ObjectBudgetTest, FreeBytesAndInput) {
         ObjectBudget budget(nInput);
         uint64_t nTaken = 0;
         while (budget.Take(info)) ++nTaken;
-        EXPECT_EQ(nTaken, (14680064 + nInput * 48) / nSize);
+        EXPECT_EQ(nTaken, (33554432 + nInput * 48) / nSize);
         budget.AddInput(nSize);  // 48 times that, and the one that was too much
         for (nTaken = 0; budget.Take(info);) ++nTaken;
         EXPECT_GE(nTaken, 47u);
         EXPECT_LE(nTaken, 48u);
     }
     ObjectBudget budget(1);
-    EXPECT_TRUE(budget.TakeBytes(14680064 + 48));
+    EXPECT_TRUE(budget.TakeBytes(33554432 + 48));
     EXPECT_FALSE(budget.TakeBytes(1));
 }
 
@@ -65,7 +65,7 @@ TEST_F(ObjectBudgetTest, ManyEmptyObjects) {
         const ref<SornObject> object = sornschema::EveryType::Factory(&pool);
         return Codec().UnmarshalFields(&info, &cursor, exact.End(), object.get());
     };
-    const auto nMost = static_cast<unsigned>(14680064 / (nSize - 2 * 48));
+    const auto nMost = static_cast<unsigned>(33554432 / (nSize - 2 * 48));
     EXPECT_TRUE(isTaken(nMost, Bytes("00")));
     EXPECT_FALSE(isTaken(nMost + 1, Bytes("00")));
     // Small objects never come near it.

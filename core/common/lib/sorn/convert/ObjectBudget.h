@@ -8,11 +8,12 @@ namespace sorn {
 
 /// What a reading may spend on objects. Two bytes of input can make an object of two thousand, so that input
 /// of a few million bytes could take gigabytes; a reading counts the bytes of the objects that it makes and
-/// fails when they pass the budget. Records that carry values never come near it. One thread at a time.
+/// fails when they pass the budget. Lists of ten thousands of records that carry next to nothing pass. One thread
+/// at a time.
 class ObjectBudget {
  public:
-    /// Free for every reading, however short its input: lists of thousands of nearly empty records pass.
-    static constexpr uint64_t freeBytesG = 14 * 1024 * 1024;
+    /// Free for every reading, however short its input: 16,000 empty objects of the largest struct.
+    static constexpr uint64_t freeBytesG = 32 * 1024 * 1024;
     /// And for each byte of input: with the slots and texts around the objects a reading stays within 64
     /// times its input.
     static constexpr uint64_t bytesPerInputByteG = 48;
