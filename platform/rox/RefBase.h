@@ -29,6 +29,8 @@ class RefBase {
     }
 
     RoxCore* GetCore() const { return pCoreM; }
+    /// Gives up the reference without taking from the count: the caller holds it then.
+    RoxCore* TakeCore() { return std::exchange(pCoreM, nullptr); }
     explicit operator bool() const { return pCoreM != nullptr; }
 
  protected:

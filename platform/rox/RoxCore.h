@@ -31,6 +31,9 @@ class RoxCore {
 
     void UpRef() { countM.fetch_add(1, std::memory_order_relaxed); }
 
+    /// The first reference on an object that nobody else has seen yet: without a read-modify-write.
+    void UpRefFirst() { countM.store(1, std::memory_order_relaxed); }
+
     /// Takes 1 from the count and destroys the object when that leaves 0. Null does nothing. Destruction of
     /// chains of any length takes bounded stack: beyond a small depth, dying objects wait in a list of the
     /// thread, which the outermost DownRef empties before it returns. A pool that ends meanwhile sees to the

@@ -19,10 +19,22 @@ class RoxGenericArray {
     RoxGenericArray& operator=(RoxGenericArray&& other) noexcept;
     RoxGenericArray(const RoxGenericArray&) = delete;
     RoxGenericArray& operator=(const RoxGenericArray&) = delete;
-    ~RoxGenericArray() { Destroy(); }
+    ~RoxGenericArray() {
+        if (pDataM != nullptr) {
+            Destroy();
+        }
+    }
 
     /// Appends and takes a reference. False, with nothing changed, when the array is full.
     bool Add(RoxCore* p);
+    /// The same with a reference that the caller holds and gives up; when the array is full it keeps it.
+    bool AddHeld(RoxCore* p) {
+        if (countM == capacityM && !Grow()) {
+            return false;
+        }
+        pDataM[countM++] = p;
+        return true;
+    }
     /// Removes the first slot that holds this very pointer, releases it, keeps the order. False when there is
     /// none.
     bool Remove(RoxCore* p);

@@ -20,7 +20,11 @@ class RoxGenericIntArray {
     RoxGenericIntArray& operator=(RoxGenericIntArray&& other) noexcept;
     RoxGenericIntArray(const RoxGenericIntArray&) = delete;
     RoxGenericIntArray& operator=(const RoxGenericIntArray&) = delete;
-    ~RoxGenericIntArray() { Destroy(); }
+    ~RoxGenericIntArray() {
+        if (FExternal()) {
+            Destroy();
+        }
+    }
 
     /// Copies one element to the end; `element` may lie in this array. False, with nothing changed, when it
     /// is full.
@@ -31,6 +35,8 @@ class RoxGenericIntArray {
     void Destroy();
 
     uint16_t GetCount() const { return countM; }
+    /// Where the count lies in the array, as a number of 16 bits, for walks over metadata.
+    static constexpr size_t CountOffset() { return offsetof(RoxGenericIntArray, countM); }
     bool FEmpty() const { return countM == 0; }
     int16_t GetElementSize() const { return elementSizeM; }
     /// True: the elements lie behind the data pointer; false: in its word.

@@ -177,6 +177,10 @@ void* RoxMempool::HeapMalloc(size_t n) {
     return CheckHeap(malloc(std::max<size_t>(n, 1)), n);
 }
 
+void RoxMempool::HeapFree(void* p) {
+    free(p);
+}
+
 void* RoxMempool::CallocIn(RoxMempool* poolOrNull, size_t n) {
     return poolOrNull != nullptr ? poolOrNull->Calloc(n) : CheckHeap(calloc(std::max<size_t>(n, 1), 1), n);
 }
@@ -184,14 +188,6 @@ void* RoxMempool::CallocIn(RoxMempool* poolOrNull, size_t n) {
 void* RoxMempool::ReallocIn(RoxMempool* poolOrNull, void* p, size_t n) {
     return poolOrNull != nullptr ? poolOrNull->Realloc(p, n)
                                  : CheckHeap(realloc(p, std::max<size_t>(n, 1)), n);
-}
-
-void RoxMempool::FreeIn(RoxMempool* poolOrNull, void* p) {
-    if (poolOrNull != nullptr) {
-        poolOrNull->Free(p);
-    } else {
-        free(p);
-    }
 }
 
 void RoxMempool::SetLeakReporter(LeakReporter reporter) {

@@ -58,7 +58,13 @@ class RoxMempool {
         __attribute__((malloc, alloc_size(2), returns_nonnull));
     [[nodiscard]] static void* ReallocIn(RoxMempool* poolOrNull, void* p, size_t n)
         __attribute__((alloc_size(3), returns_nonnull));
-    static void FreeIn(RoxMempool* poolOrNull, void* p);
+    static void FreeIn(RoxMempool* poolOrNull, void* p) {
+        if (poolOrNull != nullptr) {
+            poolOrNull->Free(p);
+        } else {
+            HeapFree(p);
+        }
+    }
 
     using LeakReporter = void (*)(const char* poolName, size_t nBlocks, size_t nBytes);
     /// Sets what every pool's destructor calls when blocks still live; null (as at start) for nothing.
@@ -70,6 +76,7 @@ class RoxMempool {
 
  private:
     static void* HeapMalloc(size_t n);
+    static void HeapFree(void* p);
 
     RoxMempoolState* pStateM;
 };

@@ -2,8 +2,6 @@
 
 #include <algorithm>
 #include <cstring>
-#include <new>
-#include <utility>
 
 #include "rox/RoxAssert.h"
 #include "rox/RoxMempool.h"
@@ -25,24 +23,19 @@ RoxStringArray& RoxStringArray::operator=(RoxStringArray&& other) noexcept {
     return *this;
 }
 
-void RoxStringArray::Grow() {
+bool RoxStringArray::Grow() {
+    if (countM == maxCount) {
+        return false;
+    }
     unsigned capacity = capacityM == 0 ? 1 : std::clamp(2u * capacityM, 4u, maxCount);
     // A string is one word without an address of its own, so it may be moved as bytes.
     pDataM = static_cast<RoxString*>(RoxMempool::ReallocIn(pMempoolM, pDataM, capacity * sizeof(RoxString)));
     capacityM = static_cast<uint16_t>(capacity);
+    return true;
 }
 
 bool RoxStringArray::Add(const RoxString& text) {
-    if (countM == maxCount) {
-        return false;
-    }
-    RoxString kept(text);
-    if (countM == capacityM) {
-        Grow();
-    }
-    new (&pDataM[countM]) RoxString(std::move(kept));
-    ++countM;
-    return true;
+    return Add(RoxString(text));
 }
 
 void RoxStringArray::Set(unsigned i, const RoxString& text) {

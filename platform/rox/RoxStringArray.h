@@ -1,6 +1,8 @@
 #pragma once
 
 #include <cstdint>
+#include <new>
+#include <utility>
 
 #include "rox/RoxLockId.h"
 #include "rox/RoxString.h"
@@ -18,11 +20,24 @@ class RoxStringArray {
     RoxStringArray& operator=(RoxStringArray&& other) noexcept;
     RoxStringArray(const RoxStringArray&) = delete;
     RoxStringArray& operator=(const RoxStringArray&) = delete;
-    ~RoxStringArray() { Destroy(); }
+    ~RoxStringArray() {
+        if (pDataM != nullptr) {
+            Destroy();
+        }
+    }
 
     /// Appends; the string may be an element of this array. False, with nothing changed, when the array is
     /// full.
     bool Add(const RoxString& text);
+    /// The same, taking the text over, which must not be an element of this array.
+    bool Add(RoxString&& text) {
+        if (countM == capacityM && !Grow()) {
+            return false;
+        }
+        new (&pDataM[countM]) RoxString(std::move(text));
+        ++countM;
+        return true;
+    }
     /// Overwrites element i < GetCount().
     void Set(unsigned i, const RoxString& text);
     /// Removes `count` elements from `first` on; what lies behind the end is nothing to remove.
@@ -50,7 +65,7 @@ class RoxStringArray {
     RoxMempool* GetMempool() const { return pMempoolM; }
 
  private:
-    void Grow();
+    bool Grow();
 
     RoxString* pDataM = nullptr;
     RoxMempool* pMempoolM;

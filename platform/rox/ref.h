@@ -15,6 +15,13 @@ class ref : public RefBase {
     ref() = default;
     ref(std::nullptr_t) {}
     ref(T* p) : RefBase(static_cast<RoxCore*>(p)) {}
+    /// The first reference on an object that has just been made.
+    static ref First(T* p) {
+        static_cast<RoxCore*>(p)->UpRefFirst();
+        ref first;
+        first.pCoreM = p;
+        return first;
+    }
     ref(const ref&) = default;
     ref(ref&&) noexcept = default;
     template <class U>

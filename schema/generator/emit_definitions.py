@@ -66,7 +66,9 @@ def _definitions(struct, catalogue):
     lines += _constructor(struct, placed)
     lines += [f"{name}::~{name}() = default;", ""]
     lines += [
-        f"ref<sorn::SornObject> {name}::Factory(RoxMempool* pool_) {{ return new (pool_) {name}(); }}",
+        f"ref<sorn::SornObject> {name}::Factory(RoxMempool* pool_) {{",
+        f"    return ref<sorn::SornObject>::First(new (pool_) {name}());",
+        "}",
         "",
     ]
     lines += _lock_owner(name, placed)

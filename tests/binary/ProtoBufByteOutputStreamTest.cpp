@@ -209,6 +209,19 @@ TEST(ProtoBufByteOutputStreamTest, TheBeginOfTheArrayEndsASection) {
     EXPECT_EQ(Hex(stream.GetData() + destination, stream.GetSize() - destination), "02 61 62");
 }
 
+TEST(ProtoBufByteOutputStreamTest, GrowthInsideCountsInTheLengthsAround) {
+    // Three ends without starts leave room for six bytes, and the lengths take nine: the innermost of 20,000
+    // is A0 9C 01, each one around it three more.
+    Stream stream;
+    for (unsigned i = 0; i < 20'000; ++i) stream.AppendByte('a');
+    Append(stream, "02 64 02 64 02 64 7A");
+    const unsigned char* data = nullptr;
+    unsigned length = 0;
+    EXPECT_EQ(stream.Finish(data, length), 3u);
+    const std::string expected = Bytes("A6 9C 01 A3 9C 01 A0 9C 01") + std::string(20'000, 'a') + "z";
+    EXPECT_EQ(std::string(reinterpret_cast<const char*>(data), length) == expected, true);
+}
+
 TEST(ProtoBufByteOutputStreamTest, MarkedFormsThatNobodyWrites) {
     struct Case {
         const char* marked;

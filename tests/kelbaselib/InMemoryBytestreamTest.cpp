@@ -6,6 +6,7 @@
 #include <thread>
 #include <vector>
 
+#include "kelbaselib/InMemoryBytesource.h"
 #include "rox/RoxMempool.h"
 
 namespace {
@@ -120,6 +121,74 @@ TEST(InMemoryBytestreamTest, SourceSeesLaterWrites) {
     EXPECT_EQ(50000u, source->GetAvailable());
     EXPECT_EQ(more, ReadAll(*source, 1000));
     source->Release();
+}
+
+namespace {
+
+using kelbaselib::InMemoryBytesource;
+
+InMemoryBytesource* SourceOf(InMemoryBytestream& stream) {
+    return dynamic_cast<InMemoryBytesource*>(stream.NewSource());
+}
+
+std::string ReleasedText(InMemoryBytesource* source) {
+    const std::string text = ReadAll(*source, 3);
+    source->Release();
+    return text;
+}
+
+}  // namespace
+
+TEST(InMemoryBytestreamTest, RangesOfASource) {
+    InMemoryBytestream stream;
+    stream.Write("abcdefgh", 8);
+    InMemoryBytesource* const source = SourceOf(stream);
+    EXPECT_EQ("abcdefgh", ReleasedText(source->NewRange(0, 8)));
+    EXPECT_EQ("cde", ReleasedText(source->NewRange(2, 5)));
+    EXPECT_EQ("h", ReleasedText(source->NewRange(7, 4294967295u)));
+    EXPECT_EQ("", ReleasedText(source->NewRange(3, 3)));
+    EXPECT_EQ("", ReleasedText(source->NewRange(5, 3)));
+    EXPECT_EQ("", ReleasedText(source->NewRange(9, 12)));
+    char two[2];
+    EXPECT_EQ(2u, source->Read(two, 2));
+    EXPECT_EQ("cd", ReleasedText(source->NewRange(0, 2)));  // from where the source stands
+    InMemoryBytesource* const range = source->NewRange(1, 5);
+    EXPECT_EQ("efg", ReleasedText(range->NewRange(1, 9)));  // and within it
+    EXPECT_EQ(4u, range->GetAvailable());
+    EXPECT_EQ(2u, range->Read(two, 2));
+    EXPECT_EQ(2u, range->GetAvailable());
+    EXPECT_EQ("fg", std::string(reinterpret_cast<const char*>(range->GetData()), 2));
+    InMemoryBytesource* const again = dynamic_cast<InMemoryBytesource*>(range->NewSource());
+    EXPECT_EQ("defg", ReleasedText(again));  // a range from its start
+    EXPECT_EQ("fg", ReleasedText(range));
+    EXPECT_EQ("cdefgh", ReleasedText(source));
+}
+
+TEST(InMemoryBytestreamTest, ARangeStandsWhateverIsWritten) {
+    RoxMempool pool("streams");
+    InMemoryBytesource* range = nullptr;
+    {
+        InMemoryBytestream stream(&pool);
+        stream.Write("abcd", 4);
+        InMemoryBytesource* const source = SourceOf(stream);
+        range = source->NewRange(1, 4);
+        const std::string more = Pattern(50000);
+        stream.Write(more.data(), 50000);  // moves the bytes
+        EXPECT_EQ(50004u, source->GetAvailable());
+        EXPECT_EQ(3u, range->GetAvailable());
+        source->Release();
+    }
+    EXPECT_EQ(50004u, range->GetStorage().GetLength());
+    EXPECT_EQ("bcd", ReleasedText(range));
+    EXPECT_EQ(0u, pool.GetUsedBytes());
+}
+
+TEST(InMemoryBytestreamTest, SourceOfAnEmptyStream) {
+    InMemoryBytestream stream;
+    InMemoryBytesource* const source = SourceOf(stream);
+    EXPECT_EQ(nullptr, source->GetData());
+    EXPECT_EQ("", ReleasedText(source->NewRange(0, 10)));
+    EXPECT_EQ("", ReleasedText(source));
 }
 
 TEST(InMemoryBytestreamTest, GrowthCopiesLittle) {

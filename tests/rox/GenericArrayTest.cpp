@@ -32,6 +32,26 @@ TEST(GenericArrayTest, TakesSixteenBytesOnTheTarget) {
     EXPECT_EQ(sizeof(RoxGenericArray), sizeof(RoxArray<Item>));
 }
 
+TEST(GenericArrayTest, TakesOverAHeldReference) {
+    RoxMempool pool("arrays");
+    {
+        RoxGenericArray array(&pool);
+        ref<Item> item(new (&pool) Item(1));
+        ref<Item> second = item;
+        EXPECT_TRUE(array.AddHeld(second.TakeCore()));
+        EXPECT_TRUE(array.AddHeld(nullptr));
+        EXPECT_EQ(2u, item->GetRefCount());
+        EXPECT_EQ(item.get(), array.At(0));
+        EXPECT_EQ(nullptr, array.At(1));
+        while (array.GetCount() < RoxGenericArray::maxCount) ASSERT_TRUE(array.AddHeld(nullptr));
+        EXPECT_FALSE(array.AddHeld(item.get()));  // and the reference is still the caller's
+        EXPECT_EQ(2u, item->GetRefCount());
+        array.Destroy();
+        EXPECT_EQ(1u, item->GetRefCount());
+    }
+    EXPECT_EQ(0u, pool.GetUsedBytes());
+}
+
 TEST(GenericArrayTest, EmptyArrayAllocatesNothing) {
     RoxMempool pool("arrays");
     RoxGenericArray array(&pool, roxMempoolUserSorn);

@@ -58,6 +58,19 @@ TEST(RefTest, CopiesCountAndMovesDoNot) {
     EXPECT_EQ(1, (*a).number);
 }
 
+TEST(RefTest, TakingTheCoreGivesUpTheReference) {
+    RoxMempool pool("refs");
+    ref<Base> a = new (&pool) Base;
+    ref<Base> b = a;
+    RoxCore* const held = b.TakeCore();
+    EXPECT_EQ(a.GetCore(), held);
+    EXPECT_TRUE(b == nullptr);
+    EXPECT_EQ(2u, a->GetRefCount());
+    RoxCore::DownRef(held);
+    EXPECT_EQ(1u, a->GetRefCount());
+    EXPECT_EQ(nullptr, b.TakeCore());
+}
+
 TEST(RefTest, AssigningItselfKeepsTheObject) {
     RoxMempool pool("refs");
     ref<Base> a = new (&pool) Base;

@@ -25,14 +25,14 @@ class IndexReadTest : public ReaderFixture {
             const FieldInfo* const field = &info.vFieldInfo[slot];
             if (field->FHole()) continue;
             const std::string name = info.FieldName(*field);
-            EXPECT_EQ(index->Find(name), field) << info.name << "." << name;
+            EXPECT_EQ(index->Find(NameKey(name)), field) << info.name << "." << name;
             EXPECT_EQ(FieldIndex::FindByWalk(info, name), field);
             for (const std::string& other : {name + "x", name.substr(0, name.size() - 1) + "#", "x" + name}) {
-                EXPECT_EQ(index->Find(other), FieldIndex::FindByWalk(info, other)) << other;
+                EXPECT_EQ(index->Find(NameKey(other)), FieldIndex::FindByWalk(info, other)) << other;
             }
             ++n;
         }
-        EXPECT_EQ(index->Find(""), nullptr);
+        EXPECT_EQ(index->Find(NameKey("")), nullptr);
         EXPECT_EQ(FieldIndex::FindByWalk(info, ""), nullptr);
         return n;
     }

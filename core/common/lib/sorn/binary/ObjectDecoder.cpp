@@ -3,9 +3,27 @@
 #include "sorn/binary/UnknownField.h"
 #include "sorn/binary/Varint.h"
 #include "sorn/binary/WireFormat.h"
-#include "sorn/model/StructInfo.h"
 
 namespace sorn {
+
+namespace {
+
+void* MemberOf(SornObject* object, const PlannedField& field) {
+    return reinterpret_cast<unsigned char*>(object) + field.storageOffset;
+}
+
+/// Reads a tag at p, which lies before the end; one of up to two bytes at once.
+inline const unsigned char* ReadTag(const unsigned char* p, const unsigned char* end, uint32_t& tag) {
+    tag = p[0];
+    if (tag < 0x80) return p + 1;
+    if (end - p >= 2 && p[1] < 0x80) [[likely]] {
+        tag = (tag & 0x7F) | uint32_t{p[1]} << 7;
+        return p + 2;
+    }
+    return varint::Read(p, end, tag);
+}
+
+}  // namespace
 
 bool ObjectDecoder::Object(uint32_t structId, ref<SornObject>* out) {
     return FinishResult(OpenObject(structId, pEndM), out);
@@ -31,19 +49,22 @@ bool ObjectDecoder::KnownDictField(ref<SornObject>* out) {
 
 bool ObjectDecoder::Fields(const StructInfo& info, SornObject* object) {
     pCallersM = object;
-    stackM.Push({object, &info, pEndM});
+    stackM.Push({object, &plansM.Of(info), pEndM});
     return Run();
 }
 
 bool ObjectDecoder::Value(const FieldInfo& field, bool isMulti, SornObject* object) {
+    PlannedField planned(field);
+    planned.kind = static_cast<uint8_t>(planned.Type() + (isMulti ? PlannedField::multiG : 0));
     if (!FHoldsObjects(field.Type())) {
-        const unsigned char* const behind = ReadValue(field, isMulti, pM, pEndM, object);
+        const unsigned char* const behind =
+            ReadValue(planned.kind, pM, {pEndM, pEndM}, object->MemberAt(field));
         if (behind == nullptr) return false;
         pM = behind;
         return true;
     }
     pCallersM = object;
-    return OpenField(field, isMulti, pEndM, object) && Run();
+    return OpenField(planned, pEndM, object) && Run();
 }
 
 bool ObjectDecoder::FinishResult(bool isOpen, ref<SornObject>* out) {
@@ -52,94 +73,24 @@ bool ObjectDecoder::FinishResult(bool isOpen, ref<SornObject>* out) {
     return true;
 }
 
-bool ObjectDecoder::Run() {
-    while (!stackM.FEmpty()) {
-        const Step step = ReadFields();
-        if (step == Step::FAILED || (step == Step::DONE && !CloseObject())) return false;
-    }
-    return true;
-}
-
-/// Reads fields until an object is opened, or the object under way is at its end.
-ObjectDecoder::Step ObjectDecoder::ReadFields() {
-    const Frame frame = stackM.Top();
-    const StructInfo& info = *frame.pInfo;
-    const unsigned char* p = pM;
-    while (p < frame.pEnd) {
-        uint32_t tag = 0;
-        p = varint::Read(p, frame.pEnd, tag);
-        if (p == nullptr) return Step::FAILED;
-        const uint32_t number = tag >> wireformat::wireTypeBitsG;
-        if (number >= static_cast<uint32_t>(info.nFields) || info.vFieldInfo[number].FHole()) [[unlikely]] {
-            p = PassUnknownField(info, tag, p, frame.pEnd);
-            if (p == nullptr) return Step::FAILED;
-            continue;
-        }
-        // The tag's wire type is not looked at: the value is what the field says.
-        const FieldInfo& field = info.vFieldInfo[number];
-        if (field.presenceOffset != 0) reinterpret_cast<char*>(frame.pObject)[field.presenceOffset] = 1;
-        const bool isMulti = field.arity == SORN_ARITY_MULTI;
-        if (FHoldsObjects(field.Type())) {
-            pM = p;
-            return OpenField(field, isMulti, frame.pEnd, frame.pObject) ? Step::OPENED : Step::FAILED;
-        }
-        p = ReadValue(field, isMulti, p, frame.pEnd, frame.pObject);
-        if (p == nullptr) return Step::FAILED;
-    }
-    pM = p;
-    return Step::DONE;
-}
-
-/// Ends an object, whose bytes must be used up exactly: an object inside may have gone beyond them.
-bool ObjectDecoder::CloseObject() {
-    const Frame frame = stackM.Top();
-    stackM.Pop();
-    if (pM != frame.pEnd) return false;
-    if (pCallersM == nullptr || frame.pObject != resultM.get()) return true;
-    const FieldTarget target(pCallersM->MemberAt(*pCallersFieldM), callersFieldIsMultiM);
-    return target.StoreReference(std::exchange(resultM, nullptr));
-}
-
-/// Opens the object that a field's value is.
-bool ObjectDecoder::OpenField(const FieldInfo& field, bool isMulti, const unsigned char* end,
-                              SornObject* object) {
-    uint32_t structId = field.typeRef;
-    uint32_t nBytes = 0;
-    const bool isRead = field.Type() == SORN_DATA_TYPE_OBJECT ? ReadLength(end, nBytes)
-                                                              : ReadKnownFieldHead(end, structId, nBytes);
-    if (!isRead) return false;
-    const unsigned char* const innerEnd = pM + nBytes;
-    if (object == pCallersM) {
-        pCallersFieldM = &field;
-        callersFieldIsMultiM = isMulti;
-        return OpenObject(structId, innerEnd);
-    }
-    const StructInfo* info = nullptr;
-    ref<SornObject> inner = NewObject(structId, info);
-    if (inner == nullptr) return false;
-    stackM.Push({inner.get(), info, innerEnd});
-    void* const member = object->MemberAt(field);
-    if (isMulti) return static_cast<RoxGenericArray*>(member)->Add(inner.get());
-    *static_cast<RefBase*>(member) = std::move(inner);
-    return true;
+/// Null for an id that names no struct, and beyond the budget.
+inline ref<SornObject> ObjectDecoder::NewObject(uint32_t structId, const StructPlan*& plan) {
+    const StructInfo* const info = tableM.Find(structId);
+    if (info == nullptr) return nullptr;
+    plan = &plansM.Of(*info);
+    if (!budgetM.TakeBytes(plan->ObjectBytes())) return nullptr;
+    ref<SornObject> object = info->Factory(pMempoolM);
+    object->SetDebugLockOwner(0);
+    return object;
 }
 
 /// Opens an object that resultM holds.
 bool ObjectDecoder::OpenObject(uint32_t structId, const unsigned char* end) {
-    const StructInfo* info = nullptr;
-    resultM = NewObject(structId, info);
+    const StructPlan* plan = nullptr;
+    resultM = NewObject(structId, plan);
     if (resultM == nullptr) return false;
-    stackM.Push({resultM.get(), info, end});
+    stackM.Push({resultM.get(), plan, end});
     return true;
-}
-
-/// Null for an id that names no struct, and beyond the budget.
-ref<SornObject> ObjectDecoder::NewObject(uint32_t structId, const StructInfo*& info) {
-    info = tableM.Find(structId);
-    if (info == nullptr || !budgetM.Take(*info)) return nullptr;
-    ref<SornObject> object = info->Factory(pMempoolM);
-    object->SetDebugLockOwner(0);
-    return object;
 }
 
 /// Reads the length of what follows, which must lie in the bytes of the reading, but may go beyond `end`.
@@ -164,6 +115,113 @@ bool ObjectDecoder::ReadKnownHead(const unsigned char* end, uint32_t& structId, 
 bool ObjectDecoder::ReadKnownFieldHead(const unsigned char* end, uint32_t& structId, uint32_t& nBytes) {
     uint32_t nValue = 0;
     return ReadLength(end, nValue) && ReadKnownHead(pM + nValue, structId, nBytes);
+}
+
+/// Ends an object, whose bytes must be used up exactly: an object inside may have gone beyond them.
+bool ObjectDecoder::CloseObject() {
+    const Frame frame = stackM.Top();
+    stackM.Pop();
+    if (pM != frame.pEnd) return false;
+    if (pCallersM == nullptr || frame.pObject != resultM.get()) return true;
+    const FieldTarget target(MemberOf(pCallersM, callersFieldM), callersFieldM.FMulti());
+    return target.StoreReference(std::exchange(resultM, nullptr));
+}
+
+/// Opens the object that a field's value is.
+inline bool ObjectDecoder::OpenField(const PlannedField& field, const unsigned char* end,
+                                     SornObject* object) {
+    uint32_t structId = field.typeRef;
+    uint32_t nBytes = 0;
+    const bool isRead = field.Type() == SORN_DATA_TYPE_OBJECT ? ReadLength(end, nBytes)
+                                                              : ReadKnownFieldHead(end, structId, nBytes);
+    if (!isRead) return false;
+    const unsigned char* const innerEnd = pM + nBytes;
+    if (object == pCallersM) {
+        callersFieldM = field;
+        return OpenObject(structId, innerEnd);
+    }
+    const StructPlan* plan = nullptr;
+    ref<SornObject> inner = NewObject(structId, plan);
+    if (inner == nullptr) return false;
+    stackM.Push({inner.get(), plan, innerEnd});
+    void* const member = MemberOf(object, field);
+    if (!field.FMulti()) {
+        *static_cast<RefBase*>(member) = std::move(inner);
+        return true;
+    }
+    if (!static_cast<RoxGenericArray*>(member)->AddHeld(inner.get())) return false;
+    inner.TakeCore();
+    return true;
+}
+
+/// Reads fields until an object is opened, or the object under way is at its end.
+ObjectDecoder::Step ObjectDecoder::ReadFields() {
+    const Frame frame = stackM.Top();
+    const StructPlan& plan = *frame.pPlan;
+    const Bounds bounds{frame.pEnd, pEndM};
+    const unsigned char* p = pM;
+    while (p < bounds.end) {
+        uint32_t tag = 0;
+        p = ReadTag(p, bounds.end, tag);
+        if (p == nullptr) return Step::FAILED;
+        const uint32_t slot = tag >> wireformat::wireTypeBitsG;
+        if (slot >= plan.NSlots() || plan.Slot(slot).kind == PlannedField::holeG) [[unlikely]] {
+            p = PassUnknownField(plan.Info(), tag, p, bounds.end);
+            if (p == nullptr) return Step::FAILED;
+            continue;
+        }
+        // The tag's wire type is not looked at: the value is what the field says.
+        const PlannedField& field = plan.Slot(slot);
+        auto* const object = reinterpret_cast<unsigned char*>(frame.pObject);
+        if (field.presenceOffset != 0) object[field.presenceOffset] = 1;
+        void* const member = object + field.storageOffset;
+        switch (field.kind) {
+            case SORN_DATA_TYPE_BOOL:
+                p = wirevalues::ReadBool<false>(p, bounds, member);
+                break;
+            case SORN_DATA_TYPE_DATE:
+            case SORN_DATA_TYPE_S32:
+                p = wirevalues::ReadSigned<false, uint32_t>(p, bounds, member);
+                break;
+            case SORN_DATA_TYPE_DATETIME:
+            case SORN_DATA_TYPE_S64:
+                p = wirevalues::ReadSigned<false, uint64_t>(p, bounds, member);
+                break;
+            case SORN_DATA_TYPE_ENUM:
+            case SORN_DATA_TYPE_INT_ID:
+            case SORN_DATA_TYPE_TIME:
+            case SORN_DATA_TYPE_U32:
+                p = wirevalues::ReadUnsigned<false, uint32_t>(p, bounds, member);
+                break;
+            case SORN_DATA_TYPE_LONG_ID:
+            case SORN_DATA_TYPE_U64:
+                p = wirevalues::ReadUnsigned<false, uint64_t>(p, bounds, member);
+                break;
+            case SORN_DATA_TYPE_STRING:
+            case SORN_DATA_TYPE_STRING_ID:
+                p = wirevalues::ReadText<false>(p, bounds, pMempoolM, member);
+                break;
+            case SORN_DATA_TYPE_OBJECT:
+            case SORN_DATA_TYPE_KNOWN_DICT:
+            case SORN_DATA_TYPE_OBJECT + PlannedField::multiG:
+            case SORN_DATA_TYPE_KNOWN_DICT + PlannedField::multiG:
+                pM = p;
+                return OpenField(field, frame.pEnd, frame.pObject) ? Step::OPENED : Step::FAILED;
+            default:
+                p = ReadValue(field.kind, p, bounds, member);
+        }
+        if (p == nullptr) return Step::FAILED;
+    }
+    pM = p;
+    return Step::DONE;
+}
+
+bool ObjectDecoder::Run() {
+    while (!stackM.FEmpty()) {
+        const Step step = ReadFields();
+        if (step == Step::FAILED || (step == Step::DONE && !CloseObject())) return false;
+    }
+    return true;
 }
 
 }  // namespace sorn

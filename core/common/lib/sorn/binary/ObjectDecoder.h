@@ -4,6 +4,8 @@
 
 #include "rox/RoxWorkStack.h"
 #include "rox/ref.h"
+#include "sorn/binary/StructPlan.h"
+#include "sorn/binary/WireValues.h"
 #include "sorn/convert/FieldAccess.h"
 #include "sorn/convert/ObjectBudget.h"
 #include "sorn/convert/StructTable.h"
@@ -51,34 +53,30 @@ class ObjectDecoder {
     /// the one right inside an object of the caller's: resultM holds these.
     struct Frame {
         SornObject* pObject;
-        const StructInfo* pInfo;
+        const StructPlan* pPlan;
         const unsigned char* pEnd;  ///< where its bytes end; its fields must end there, too
     };
+    using Bounds = wirevalues::Bounds;
     enum class Step { DONE, OPENED, FAILED };
 
     bool Run();
     Step ReadFields();
     bool CloseObject();
     bool OpenObject(uint32_t structId, const unsigned char* end);
-    bool OpenField(const FieldInfo& field, bool isMulti, const unsigned char* end, SornObject* object);
+    bool OpenField(const PlannedField& field, const unsigned char* end, SornObject* object);
     bool FinishResult(bool isOpen, ref<SornObject>* out);
-    ref<SornObject> NewObject(uint32_t structId, const StructInfo*& info);
+    ref<SornObject> NewObject(uint32_t structId, const StructPlan*& plan);
     bool ReadLength(const unsigned char* end, uint32_t& nBytes);
     bool ReadKnownHead(const unsigned char* end, uint32_t& structId, uint32_t& nBytes);
     bool ReadKnownFieldHead(const unsigned char* end, uint32_t& structId, uint32_t& nBytes);
 
-    // Readers of values at p: give the place behind, or null.
-    const unsigned char* ReadValue(const FieldInfo& field, bool isMulti, const unsigned char* p,
-                                   const unsigned char* end, SornObject* object);
+    // Readers as those of wirevalues; `kind` is that of a PlannedField.
+    const unsigned char* ReadValue(uint8_t kind, const unsigned char* p, Bounds bounds, void* member);
     template <bool isMulti>
-    const unsigned char* ReadValue(const FieldInfo& field, const unsigned char* p, const unsigned char* end,
-                                   SornObject* object);
-    const unsigned char* ReadBytes(const unsigned char* p, const unsigned char* end,
-                                   FieldTarget target) const;
-    const unsigned char* ReadLazyBody(const unsigned char* p, const unsigned char* end,
-                                      ref<LazyDict>& body) const;
-    const unsigned char* ReadAnyDict(const unsigned char* p, const unsigned char* end, void* member,
-                                     bool isMulti);
+    const unsigned char* ReadValue(DataType type, const unsigned char* p, Bounds bounds, void* member);
+    const unsigned char* ReadBytes(const unsigned char* p, Bounds bounds, FieldTarget target) const;
+    const unsigned char* ReadLazyBody(const unsigned char* p, Bounds bounds, ref<LazyDict>& body) const;
+    const unsigned char* ReadAnyDict(const unsigned char* p, Bounds bounds, void* member, bool isMulti);
 
     RoxMempool* pMempoolM;
     StructTable tableM;
@@ -86,11 +84,11 @@ class ObjectDecoder {
     const unsigned char* pEndM;
     const ref<rox::ByteBuffer>* pOwnerM;
     ObjectBudget budgetM;
+    StructPlans plansM;
     RoxWorkStack<Frame, 8> stackM;
     ref<SornObject> resultM;
-    SornObject* pCallersM = nullptr;            // the caller's object, if the reading fills one
-    const FieldInfo* pCallersFieldM = nullptr;  // where resultM goes in it
-    bool callersFieldIsMultiM = false;
+    SornObject* pCallersM = nullptr;  // the caller's object, if the reading fills one
+    PlannedField callersFieldM;       // where resultM goes in it
 };
 
 }  // namespace sorn

@@ -10,6 +10,7 @@
 #include "sorn/dict/Dict.h"
 #include "sorn/dict/RoxByteBuffer.h"
 #include "sorn/model/ChannelNumber.h"
+#include "sorn/model/CopyShort.h"
 #include "sorn/model/Currency.h"
 
 namespace sorn {
@@ -19,13 +20,20 @@ namespace {
 static_assert(__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__, "doubles are copied as they lie in memory");
 
 /// A length and a tag.
-constexpr size_t maxHeadG = varint::maxBytes64G + varint::maxBytes32G;
-/// A text of a scalar with its length, or a number, and a tag.
-constexpr size_t maxPlainG = 24 + maxHeadG;
-static_assert(ChannelNumber::maxTextBytesG <= 24 && Currency::maxTextBytesG <= 24);
+constexpr size_t maxHeadG = varint::maxBytes64G + PlannedField::maxTagBytesG;
+/// A text of so many bytes, the length of which is one byte, is written in one piece with what is around.
+constexpr uint32_t maxShortG = 64;
+/// A short text, a text of a scalar with its length, or a number, and a tag.
+constexpr size_t maxPlainG = maxShortG + maxHeadG;
+static_assert(ChannelNumber::maxTextBytesG <= maxShortG && Currency::maxTextBytesG <= maxShortG);
+static_assert(maxShortG < 0x80);
 
-/// Slots that are looked at together: a bit of a word for each.
+/// Fields that are looked at together: a bit of a word for each.
 constexpr uint32_t nCandidatesG = 64;
+
+const void* MemberOf(const SornObject& object, const PlannedField& field) {
+    return reinterpret_cast<const unsigned char*>(&object) + field.storageOffset;
+}
 
 template <class T>
 T Load(const void* member) {
@@ -35,43 +43,40 @@ T Load(const void* member) {
 }
 
 template <class Scalar>
-unsigned char* WriteScalarText(const void* member, unsigned char* p) {
+__attribute__((noinline)) unsigned char* WriteScalarText(const void* member, unsigned char* p) {
     char text[Scalar::maxTextBytesG];
     const unsigned n = static_cast<const Scalar*>(member)->FormatTo(text);
     p -= n;
     std::memcpy(p, text, n);
-    return varint::WriteBefore(n, p);
+    return varint::WriteInRoom(n, p);
 }
 
 /// Writes a value without references so that it ends before p, where there is room for it.
-inline unsigned char* WritePlain(DataType type, const void* member, unsigned char* p) {
+__attribute__((always_inline)) inline unsigned char* WritePlain(DataType type, const void* member,
+                                                                unsigned char* p) {
     switch (type) {
         case SORN_DATA_TYPE_BOOL:
-            return varint::WriteBefore(uint32_t{Load<uint8_t>(member)}, p);
+            return varint::WriteInRoom(Load<uint8_t>(member), p);
         case SORN_DATA_TYPE_CHANNEL:
             return WriteScalarText<ChannelNumber>(member, p);
         case SORN_DATA_TYPE_CURRENCY:
             return WriteScalarText<Currency>(member, p);
         case SORN_DATA_TYPE_DATE:
         case SORN_DATA_TYPE_S32:
-            return varint::WriteBefore(varint::Zigzag(Load<int32_t>(member)), p);
+            return varint::WriteInRoom(varint::Zigzag(Load<int32_t>(member)), p);
         case SORN_DATA_TYPE_DATETIME:
         case SORN_DATA_TYPE_S64:
-            return varint::WriteBefore(varint::Zigzag(Load<int64_t>(member)), p);
+            return varint::WriteInRoom(varint::Zigzag(Load<int64_t>(member)), p);
         case SORN_DATA_TYPE_FLOAT:
             p -= sizeof(double);
             std::memcpy(p, member, sizeof(double));
             return p;
         case SORN_DATA_TYPE_LONG_ID:
         case SORN_DATA_TYPE_U64:
-            return varint::WriteBefore(Load<uint64_t>(member), p);
+            return varint::WriteInRoom(Load<uint64_t>(member), p);
         default:  // ENUM, INT_ID, TIME, U32
-            return varint::WriteBefore(Load<uint32_t>(member), p);
+            return varint::WriteInRoom(Load<uint32_t>(member), p);
     }
-}
-
-inline unsigned char* WriteTag(uint32_t tag, unsigned char* p) {
-    return tag == 0 ? p : varint::WriteBefore(tag, p);
 }
 
 }  // namespace
@@ -81,39 +86,43 @@ ObjectEncoder::~ObjectEncoder() {
 }
 
 void ObjectEncoder::Object(const SornObject& object, Form form) {
-    Open(object, form, 0, nullptr, 0);
+    Open(object, form, nullptr, nullptr, 0);
     Run();
 }
 
 void ObjectEncoder::Fields(const StructInfo& info, const SornObject& object) {
     Frame frame{};
     frame.pObject = &object;
-    frame.vFieldInfo = info.vFieldInfo;
-    frame.slot = static_cast<uint32_t>(info.nFields);
+    frame.pPlan = &plansM.Of(info);
+    frame.nLeft = frame.pPlan->NFields();
     stackM.Push(frame);
     Run();
 }
 
 void ObjectEncoder::SingleField(const FieldInfo& field, const SornObject& object) {
-    PushField(field, object, false, 0);
+    fieldM = PlannedField(field);
+    fieldM.kind %= PlannedField::multiG;
+    PushField(object);
     Run();
 }
 
 void ObjectEncoder::MultiField(uint32_t tag, const FieldInfo& field, const SornObject& object) {
-    PushField(field, object, true, tag);
+    fieldM = PlannedField(field, tag);
+    fieldM.kind = fieldM.kind % PlannedField::multiG + PlannedField::multiG;
+    PushField(object);
     Run();
 }
 
 void ObjectEncoder::LazyBody(const ref<LazyDict>& body) {
-    if (OpenLazyBody(body, 0, 1)) Run();
+    if (OpenLazyBody(body, nullptr, 1)) Run();
 }
 
-/// A frame that has one field and nothing else.
-void ObjectEncoder::PushField(const FieldInfo& field, const SornObject& object, bool isMulti, uint32_t tag) {
+/// A frame that has fieldM and nothing else.
+void ObjectEncoder::PushField(const SornObject& object) {
     Frame frame{};
     frame.pObject = &object;
     stackM.Push(frame);
-    StartField(stackM.Top(), field, isMulti, tag);
+    StartField(stackM.Top(), fieldM);
 }
 
 void ObjectEncoder::Run() {
@@ -127,87 +136,105 @@ void ObjectEncoder::Run() {
     }
 }
 
-/// Of n slots, 64 at most: a bit for each field that has a value, or may have one, as only its member tells.
-/// Without a branch for each slot, since which fields are set cannot be foretold.
-uint64_t ObjectEncoder::FindCandidates(const Frame& frame, uint32_t first, uint32_t n) {
-    const auto* const object = reinterpret_cast<const unsigned char*>(frame.pObject);
-    const FieldInfo* const fields = frame.vFieldInfo + first;
-    uint64_t candidates = 0;
-    for (uint32_t i = n; i-- > 0;) {
-        const unsigned presence = fields[i].presenceOffset;
-        const unsigned isField = fields[i].arity ^ SORN_ARITY_NONE;
-        const unsigned isSet = presence != 0 ? object[presence] : isField;
-        candidates = candidates << 1 | (isSet != 0);
-    }
-    return candidates;
+/// Writes a value before p, where there is room for maxPlainG bytes, and leaves room for a tag.
+__attribute__((always_inline)) inline unsigned char* ObjectEncoder::WriteText(const RoxString& text,
+                                                                              unsigned char* p) {
+    const uint32_t n = text.NByte();
+    if (n > maxShortG) return varint::WriteInRoom(n, outM.Room(outM.Bytes(p, text.Utf8(), n), maxHeadG));
+    p -= n;
+    CopyShort(text.Utf8(), n, p);
+    *--p = static_cast<unsigned char>(n);
+    return p;
 }
 
 /// Writes fields from the last one down until an object has been opened; false when no field is left.
 bool ObjectEncoder::StepFields() {
     Frame& frame = stackM.Top();
+    const StructPlan* const plan = frame.pPlan;
     const auto* const object = reinterpret_cast<const unsigned char*>(frame.pObject);
+    uint64_t candidates = frame.candidates;
     unsigned char* p = outM.Begin();
     for (;;) {
-        while (frame.candidates == 0) {
-            if (frame.slot == 0) {
+        while (candidates == 0) {
+            if (frame.nLeft == 0) {
                 outM.Commit(p);
                 return false;
             }
-            const uint32_t n = std::min(frame.slot, nCandidatesG);
-            frame.slot -= n;
-            frame.candidates = FindCandidates(frame, frame.slot, n);
+            const uint32_t n = std::min(frame.nLeft, nCandidatesG);
+            frame.nLeft -= n;
+            candidates = plan->FindSet(object, frame.nLeft, n);
         }
-        const auto bit = 63 - static_cast<uint32_t>(__builtin_clzll(frame.candidates));
-        frame.candidates ^= uint64_t{1} << bit;
-        const uint32_t slot = frame.slot + bit;
-        const FieldInfo& field = frame.vFieldInfo[slot];
-        const bool isMulti = field.arity == SORN_ARITY_MULTI;
-        const DataType type = field.Type();
-        const uint32_t tag = wireformat::TagOf(slot, wireformat::WireTypeOf(type));
+        const auto bit = 63 - static_cast<uint32_t>(__builtin_clzll(candidates));
+        candidates ^= uint64_t{1} << bit;
+        const PlannedField& field = plan->Field(frame.nLeft + bit);
         const unsigned char* const member = object + field.storageOffset;
-        const FieldStorage storage = StorageOf(type);
-        if (!isMulti && storage == FieldStorage::PLAIN) {
-            p = outM.Room(p, maxPlainG);
-            p = varint::WriteBefore(tag, WritePlain(type, member, p));
-        } else if (!isMulti && storage == FieldStorage::TEXT) {
-            const RoxString& text = *reinterpret_cast<const RoxString*>(member);
-            const uint32_t n = text.NByte();
-            p = outM.Room(outM.Bytes(p, text.Utf8(), n), maxHeadG);
-            p = varint::WriteBefore(tag, varint::WriteBefore(n, p));
-        } else {
-            outM.Commit(p);
-            if (StartField(frame, field, isMulti, tag)) return true;
-            p = outM.Begin();
+        p = outM.Room(p, maxPlainG);
+        switch (field.kind) {
+            case SORN_DATA_TYPE_BOOL:
+                p = WritePlain(SORN_DATA_TYPE_BOOL, member, p);
+                break;
+            case SORN_DATA_TYPE_CHANNEL:
+            case SORN_DATA_TYPE_CURRENCY:
+            case SORN_DATA_TYPE_FLOAT:
+                p = WritePlain(field.Type(), member, p);
+                break;
+            case SORN_DATA_TYPE_DATE:
+            case SORN_DATA_TYPE_S32:
+                p = WritePlain(SORN_DATA_TYPE_S32, member, p);
+                break;
+            case SORN_DATA_TYPE_DATETIME:
+            case SORN_DATA_TYPE_S64:
+                p = WritePlain(SORN_DATA_TYPE_S64, member, p);
+                break;
+            case SORN_DATA_TYPE_LONG_ID:
+            case SORN_DATA_TYPE_U64:
+                p = WritePlain(SORN_DATA_TYPE_U64, member, p);
+                break;
+            case SORN_DATA_TYPE_ENUM:
+            case SORN_DATA_TYPE_INT_ID:
+            case SORN_DATA_TYPE_TIME:
+            case SORN_DATA_TYPE_U32:
+                p = WritePlain(SORN_DATA_TYPE_U32, member, p);
+                break;
+            case SORN_DATA_TYPE_STRING:
+            case SORN_DATA_TYPE_STRING_ID:
+                p = WriteText(*reinterpret_cast<const RoxString*>(member), p);
+                break;
+            default:
+                frame.candidates = candidates;
+                outM.Commit(p);
+                if (StartField(frame, field)) return true;
+                p = outM.Begin();
+                continue;
         }
+        p = field.WriteTag(p);
     }
 }
 
 /// Writes a field, or, when it holds objects or bodies, opens the last one; true when one has been opened.
-bool ObjectEncoder::StartField(Frame& frame, const FieldInfo& field, bool isMulti, uint32_t tag) {
+bool ObjectEncoder::StartField(Frame& frame, const PlannedField& field) {
     const DataType type = field.Type();
-    const FieldSource source(frame.pObject->MemberAt(field), isMulti);
+    const FieldSource source(MemberOf(*frame.pObject, field), field.FMulti());
     if (!FHoldsObjects(type) && type != SORN_DATA_TYPE_KNOWN_DICT_AS_LAZY) {
-        WriteElements(field, source, tag);
+        WriteElements(field, source);
         return false;
     }
     frame.nElements = source.Count(type);
     frame.pField = &field;
-    frame.tag = tag;
-    frame.isMulti = isMulti;
     return frame.nElements != 0 && OpenElement(frame);
 }
 
 /// Opens the last of the elements that are left and not null; false when there is none. `frame` may move.
 bool ObjectEncoder::OpenElement(Frame& frame) {
-    const FieldInfo& field = *frame.pField;
-    const FieldSource source(frame.pObject->MemberAt(field), frame.isMulti);
+    const PlannedField& field = *frame.pField;
+    const FieldSource source(MemberOf(*frame.pObject, field), field.FMulti());
     while (frame.nElements != 0) {
         const uint32_t i = --frame.nElements;
         if (field.Type() == SORN_DATA_TYPE_KNOWN_DICT_AS_LAZY) {
-            if (OpenLazyBody(source.SharedAt<LazyDict>(i), frame.tag, frame.nLazyLevels + 1)) return true;
+            if (OpenLazyBody(source.SharedAt<LazyDict>(i), &field, frame.nLazyLevels + 1)) return true;
         } else if (const auto* const object = source.ReferenceAt<SornObject>(i)) {
             const Form form = field.Type() == SORN_DATA_TYPE_OBJECT ? SUBDICT : KNOWN_FIELD;
-            Open(*object, form, frame.tag, nullptr, frame.nLazyLevels);
+            Open(*object, form, &field, nullptr, frame.nLazyLevels);
             return true;
         }
     }
@@ -215,7 +242,8 @@ bool ObjectEncoder::OpenElement(Frame& frame) {
 }
 
 /// Opens the object that a body converts to; false when there is no body.
-bool ObjectEncoder::OpenLazyBody(const ref<LazyDict>& body, uint32_t tag, uint32_t nLazyLevels) {
+bool ObjectEncoder::OpenLazyBody(const ref<LazyDict>& body, const PlannedField* headTag,
+                                 uint32_t nLazyLevels) {
     if (body == nullptr) return false;
     ref<SornObject> object;
     if (nLazyLevels <= maxLazyLevelsG) {
@@ -227,31 +255,31 @@ bool ObjectEncoder::OpenLazyBody(const ref<LazyDict>& body, uint32_t tag, uint32
     }
     if (object == nullptr) return false;
     object->UpRef();
-    Open(*object, KNOWN_FIELD, tag, object.get(), nLazyLevels);
+    Open(*object, KNOWN_FIELD, headTag, object.get(), nLazyLevels);
     return true;
 }
 
 /// Takes over a hold on `held`, which may be null.
-void ObjectEncoder::Open(const SornObject& object, Form form, uint32_t headTag, RoxCore* held,
-                         uint32_t nLazyLevels) {
+inline void ObjectEncoder::Open(const SornObject& object, Form form, const PlannedField* headTag,
+                                RoxCore* held, uint32_t nLazyLevels) {
     const StructInfo* const info = tableM.Find(object.structId);
     RoxAssert(info != nullptr, "the object is of a struct of the schema");
-    stackM.Emplace(&object, info->vFieldInfo, static_cast<uint32_t>(info->nFields), uint64_t{0}, uint32_t{0},
-                   static_cast<const FieldInfo*>(nullptr), uint32_t{0}, headTag, outM.Count(), held,
-                   nLazyLevels, form, false);
+    const StructPlan& plan = plansM.Of(*info);
+    stackM.Emplace(&object, &plan, uint64_t{0}, plan.NFields(), uint32_t{0},
+                   static_cast<const PlannedField*>(nullptr), headTag, outM.Count(), held, nLazyLevels, form);
 }
 
 /// Writes what stands before the object.
-void ObjectEncoder::Close() {
+inline void ObjectEncoder::Close() {
     const Frame& frame = stackM.Top();
     if (frame.form != FIELDS) {
         unsigned char* p = outM.Room(outM.Begin(), 2 * maxHeadG);
-        p = varint::WriteBefore(outM.Count(p) - frame.end, p);
+        p = varint::WriteInRoom(outM.Count(p) - frame.end, p);
         if (frame.form != SUBDICT) {
-            p = varint::WriteBefore(wireformat::TagOf(frame.pObject->structId, wireformat::BYTES), p);
+            p = varint::WriteInRoom(wireformat::TagOf(frame.pObject->structId, wireformat::BYTES), p);
         }
-        if (frame.form == KNOWN_FIELD) p = varint::WriteBefore(outM.Count(p) - frame.end, p);
-        outM.Commit(WriteTag(frame.headTag, p));
+        if (frame.form == KNOWN_FIELD) p = varint::WriteInRoom(outM.Count(p) - frame.end, p);
+        outM.Commit(frame.pHeadTag == nullptr ? p : frame.pHeadTag->WriteTag(p));
     }
     RoxCore* const held = frame.pHeld;
     stackM.Pop();
@@ -259,47 +287,49 @@ void ObjectEncoder::Close() {
 }
 
 /// The values of a field that holds neither objects nor bodies, each with the tag.
-void ObjectEncoder::WriteElements(const FieldInfo& field, const FieldSource& source, uint32_t tag) {
+void ObjectEncoder::WriteElements(const PlannedField& field, const FieldSource& source) {
     const DataType type = field.Type();
+    unsigned char* p = outM.Begin();
     for (uint32_t i = source.Count(type); i-- > 0;) {
+        p = outM.Room(p, maxPlainG);
         switch (type) {
             case SORN_DATA_TYPE_STRING:
             case SORN_DATA_TYPE_STRING_ID:
-                WriteText(source.TextAt(i), tag);
+                p = WriteText(source.TextAt(i), p);
                 break;
-            case SORN_DATA_TYPE_BYTESTRING:
-                WriteBytes(source.ReferenceAt<rox::ByteBuffer>(i), tag);
+            case SORN_DATA_TYPE_BYTESTRING: {
+                const auto* const bytes = source.ReferenceAt<rox::ByteBuffer>(i);
+                if (bytes == nullptr) continue;
+                p = WriteBytes(*bytes, p);
                 break;
-            case SORN_DATA_TYPE_ANY_DICT:
-                WriteAnyDict(source.ReferenceAt<Dict>(i), tag);
+            }
+            case SORN_DATA_TYPE_ANY_DICT: {
+                const auto* const dict = source.ReferenceAt<Dict>(i);
+                if (dict == nullptr) continue;
+                p = WriteAnyDict(*dict, p);
                 break;
+            }
             default:
-                unsigned char* const p = outM.Room(outM.Begin(), maxPlainG);
-                outM.Commit(WriteTag(tag, WritePlain(type, &source.PlainAt<unsigned char>(i), p)));
+                p = WritePlain(type, &source.PlainAt<unsigned char>(i), p);
         }
+        p = field.WriteTag(p);
     }
+    outM.Commit(p);
 }
 
-void ObjectEncoder::WriteText(const RoxString& text, uint32_t tag) {
-    unsigned char* const p = outM.Room(outM.Bytes(outM.Begin(), text.Utf8(), text.NByte()), maxHeadG);
-    outM.Commit(WriteTag(tag, varint::WriteBefore(text.NByte(), p)));
+// As WriteText.
+
+unsigned char* ObjectEncoder::WriteBytes(const rox::ByteBuffer& bytes, unsigned char* p) {
+    if (!bytes.FEmpty()) p = outM.Bytes(p, bytes.GetData(), bytes.GetLength());
+    return varint::WriteInRoom(bytes.GetLength(), outM.Room(p, maxHeadG));
 }
 
-void ObjectEncoder::WriteBytes(const rox::ByteBuffer* bytes, uint32_t tag) {
-    if (bytes == nullptr) return;
-    unsigned char* p = outM.Begin();
-    if (!bytes->FEmpty()) p = outM.Bytes(p, bytes->GetData(), bytes->GetLength());
-    p = outM.Room(p, maxHeadG);
-    outM.Commit(WriteTag(tag, varint::WriteBefore(bytes->GetLength(), p)));
-}
-
-void ObjectEncoder::WriteAnyDict(const Dict* dict, uint32_t tag) {
-    if (dict == nullptr) return;
-    const size_t end = outM.Count();
-    AnyDictEncoder(pMempoolM, outM).Body(*dict->GetDictionary());
-    unsigned char* p = outM.Room(outM.Begin(), maxHeadG);
-    p = varint::WriteBefore(outM.Count(p) - end, p);
-    outM.Commit(WriteTag(tag, p));
+unsigned char* ObjectEncoder::WriteAnyDict(const Dict& dict, unsigned char* p) {
+    const size_t end = outM.Count(p);
+    outM.Commit(p);
+    AnyDictEncoder(pMempoolM, outM).Body(*dict.GetDictionary());
+    p = outM.Room(outM.Begin(), maxHeadG);
+    return varint::WriteInRoom(outM.Count(p) - end, p);
 }
 
 }  // namespace sorn

@@ -4,6 +4,7 @@
 
 #include "rox/RoxWorkStack.h"
 #include "sorn/binary/ReverseBuffer.h"
+#include "sorn/binary/StructPlan.h"
 #include "sorn/convert/FieldAccess.h"
 #include "sorn/convert/StructTable.h"
 #include "sorn/dict/LazyBody.h"
@@ -44,37 +45,37 @@ class ObjectEncoder {
     /// An object under way, or one field of it.
     struct Frame {
         const SornObject* pObject;
-        const FieldInfo* vFieldInfo;
-        uint32_t slot;            ///< the slots below it are left, apart from those of `candidates`
-        uint64_t candidates;      ///< of the slots from `slot` on: those that are left to be looked at
-        uint32_t nElements;       ///< elements that are left of the field of objects under way
-        const FieldInfo* pField;  ///< that field
-        uint32_t tag;             ///< its tag; 0 for none
-        uint32_t headTag;         ///< the tag that stands before the object; 0 for none
-        size_t end;               ///< bytes behind the object
-        RoxCore* pHeld;           ///< what keeps the object alive, or null
-        uint32_t nLazyLevels;     ///< lazy bodies around
+        const StructPlan* pPlan;       ///< null for a frame of one field
+        uint64_t candidates;           ///< of the fields from nLeft on: those that are left and have values
+        uint32_t nLeft;                ///< the fields below it are left, apart from those of `candidates`
+        uint32_t nElements;            ///< elements that are left of the field of objects under way
+        const PlannedField* pField;    ///< that field
+        const PlannedField* pHeadTag;  ///< whose tag stands before the object; null for none
+        size_t end;                    ///< bytes behind the object
+        RoxCore* pHeld;                ///< what keeps the object alive, or null
+        uint32_t nLazyLevels;          ///< lazy bodies around
         Form form;
-        bool isMulti;  ///< how the field under way holds its values
     };
 
     void Run();
     bool StepFields();
-    static uint64_t FindCandidates(const Frame& frame, uint32_t first, uint32_t n);
-    bool StartField(Frame& frame, const FieldInfo& field, bool isMulti, uint32_t tag);
+    bool StartField(Frame& frame, const PlannedField& field);
     bool OpenElement(Frame& frame);
-    bool OpenLazyBody(const ref<LazyDict>& body, uint32_t tag, uint32_t nLazyLevels);
-    void Open(const SornObject& object, Form form, uint32_t headTag, RoxCore* held, uint32_t nLazyLevels);
-    void PushField(const FieldInfo& field, const SornObject& object, bool isMulti, uint32_t tag);
+    bool OpenLazyBody(const ref<LazyDict>& body, const PlannedField* headTag, uint32_t nLazyLevels);
+    void Open(const SornObject& object, Form form, const PlannedField* headTag, RoxCore* held,
+              uint32_t nLazyLevels);
+    void PushField(const SornObject& object);
     void Close();
-    void WriteElements(const FieldInfo& field, const FieldSource& source, uint32_t tag);
-    void WriteText(const RoxString& text, uint32_t tag);
-    void WriteBytes(const rox::ByteBuffer* bytes, uint32_t tag);
-    void WriteAnyDict(const Dict* dict, uint32_t tag);
+    void WriteElements(const PlannedField& field, const FieldSource& source);
+    unsigned char* WriteText(const RoxString& text, unsigned char* p);
+    unsigned char* WriteBytes(const rox::ByteBuffer& bytes, unsigned char* p);
+    unsigned char* WriteAnyDict(const Dict& dict, unsigned char* p);
 
     RoxMempool* pMempoolM;
     StructTable tableM;
     ReverseBuffer& outM;
+    StructPlans plansM;
+    PlannedField fieldM;  // of a walk over one field
     RoxWorkStack<Frame, 8> stackM;
 };
 

@@ -2,6 +2,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 
 /// The variable-length integers in memory: what GoogleInt, the encoder and the decoder share.
 namespace sorn::varint {
@@ -26,7 +27,7 @@ constexpr int64_t Unzigzag(uint64_t value) {
 /// The number of bytes of the shortest form.
 inline unsigned Size(uint64_t value) {
     const unsigned nBits = 64 - static_cast<unsigned>(__builtin_clzll(value | 1));
-    return (nBits + 6) / 7;
+    return (nBits * 9 + 64) / 64;
 }
 
 /// Writes the shortest form forwards; gives the place behind it.
@@ -52,6 +53,38 @@ inline unsigned char* WriteBefore(Unsigned value, unsigned char* end) {
     unsigned char* const begin = end - Size(value);
     Write(value, begin);
     return begin;
+}
+
+/// The groups of seven bits, eight of them at most, each in a byte of its own.
+inline uint64_t SpreadGroups(uint64_t value) {
+    value = (value & 0x000000000FFFFFFF) | (value & 0x00FFFFFFF0000000) << 4;
+    value = (value & 0x00003FFF00003FFF) | (value & 0x0FFFC0000FFFC000) << 2;
+    return (value & 0x007F007F007F007F) | (value & 0x3F803F803F803F80) << 1;
+}
+/// The other way round.
+inline uint64_t JoinGroups(uint64_t bytes) {
+    bytes = (bytes & 0x007F007F007F007F) | (bytes & 0x7F007F007F007F00) >> 1;
+    bytes = (bytes & 0x00003FFF00003FFF) | (bytes & 0x3FFF00003FFF0000) >> 2;
+    return (bytes & 0x000000000FFFFFFF) | (bytes & 0x0FFFFFFF00000000) >> 4;
+}
+constexpr uint64_t topBitsG = 0x8080808080808080;
+
+/// Writes the shortest form so that it ends before `end`; gives its first byte. Without a branch for each
+/// byte: maxBytes64G bytes before `end` are overwritten.
+inline unsigned char* WriteInRoom(uint64_t value, unsigned char* end) {
+    static_assert(__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__);
+    if (value < 0x80) {
+        *--end = static_cast<unsigned char>(value);
+        return end;
+    }
+    if (value >> 56 != 0) [[unlikely]] {
+        return WriteBefore(value, end);
+    }
+    const unsigned n = Size(value);
+    const uint64_t bytes = SpreadGroups(value) | (topBitsG & ((uint64_t{1} << 8 * (n - 1)) - 1));
+    const uint64_t word = bytes << (64 - 8 * n);
+    std::memcpy(end - sizeof word, &word, sizeof word);
+    return end - n;
 }
 
 /// Reads a number of at most nMax bytes that lies before `end`; gives the place behind it, or null.
@@ -88,6 +121,23 @@ inline const unsigned char* Read(const unsigned char* p, const unsigned char* en
         return p + 1;
     }
     return ReadLong64(p, end, value);
+}
+
+/// The same for p before `end`, and faster for numbers of several bytes where more may be looked at than what
+/// lies before `end`: all before `readable`, which does not lie before `end`.
+template <class Unsigned>
+inline const unsigned char* ReadWithin(const unsigned char* p, const unsigned char* end,
+                                       const unsigned char* readable, Unsigned& value) {
+    constexpr unsigned nMax = sizeof(Unsigned) == sizeof(uint32_t) ? maxBytes32G : maxBytes64G;
+    uint64_t bytes = 0;
+    if (static_cast<size_t>(readable - p) < sizeof bytes) return Read(p, end, value);
+    std::memcpy(&bytes, p, sizeof bytes);
+    const uint64_t stops = ~bytes & topBitsG;
+    if (stops == 0) return Read(p, end, value);
+    const unsigned n = (static_cast<unsigned>(__builtin_ctzll(stops)) + 1) / 8;
+    if (n > nMax || n > static_cast<size_t>(end - p)) return nullptr;
+    value = static_cast<Unsigned>(JoinGroups(bytes & (stops ^ (stops - 1))));
+    return p + n;
 }
 
 }  // namespace sorn::varint

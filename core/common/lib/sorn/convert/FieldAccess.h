@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <utility>
 
 #include "rox/RoxGenericArray.h"
 #include "rox/RoxGenericIntArray.h"
@@ -106,6 +107,20 @@ class FieldTarget {
     bool StoreText(const RoxString& text) const {
         if (isMultiM) return static_cast<RoxStringArray*>(pMemberM)->Add(text);
         *static_cast<RoxString*>(pMemberM) = text;
+        return true;
+    }
+    bool StoreText(RoxString&& text) const {
+        if (isMultiM) return static_cast<RoxStringArray*>(pMemberM)->Add(std::move(text));
+        *static_cast<RoxString*>(pMemberM) = std::move(text);
+        return true;
+    }
+    bool StoreReference(RefBase&& value) const {
+        if (!isMultiM) {
+            *static_cast<RefBase*>(pMemberM) = std::move(value);
+            return true;
+        }
+        if (!static_cast<RoxGenericArray*>(pMemberM)->AddHeld(value.GetCore())) return false;
+        value.TakeCore();
         return true;
     }
     bool StoreReference(const RefBase& value) const {

@@ -29,26 +29,41 @@ void JsonOutput::Blanks(size_t n) {
     }
 }
 
+JsonBufferOutput::JsonBufferOutput(ByteBuffer& buffer) : bufferM(buffer) {
+    pBeginM = pNextM = firstM;
+    pEndM = firstM + sizeof firstM;
+}
+
 void JsonBufferOutput::Close() {
-    bufferM.Commit(static_cast<unsigned>(pNextM - pBeginM));
-    pBeginM = pNextM = pEndM = nullptr;
+    const auto n = static_cast<unsigned>(pNextM - pBeginM);
+    if (pBeginM == firstM) {
+        bufferM.AppendBytes(firstM, n);
+    } else {
+        bufferM.Commit(n);
+    }
 }
 
 void JsonBufferOutput::NextWindow(unsigned n) {
-    constexpr unsigned smallestWindow = 256;
     constexpr unsigned largestWindow = 1u << 28;
-    Close();
-    const unsigned length = bufferM.GetLength();
+    unsigned nFirst = 0;
+    if (pBeginM == firstM) {
+        nFirst = static_cast<unsigned>(pNextM - firstM);
+    } else {
+        Close();
+    }
+    const unsigned length = bufferM.GetLength() + nFirst;
     const unsigned capacity = bufferM.GetCapacity();
     // The buffer keeps its capacity a byte ahead of its data.
     unsigned window = capacity > length ? capacity - length - 1 : 0;
     if (window < n) {
         // As much again as stands there, so that a long text is moved few times.
-        window = std::max({n, smallestWindow, std::min(length, largestWindow)});
+        window = std::max(n, std::min(length, largestWindow));
         if (window > (~0u - length) / 2) window = n;
     }
-    pBeginM = pNextM = bufferM.Reserve(window);
-    pEndM = pBeginM + window;
+    pBeginM = bufferM.Reserve(nFirst + window);
+    pEndM = pBeginM + nFirst + window;
+    pNextM = pBeginM + nFirst;
+    if (nFirst != 0) std::memcpy(pBeginM, firstM, nFirst);
 }
 
 JsonTextOutput::JsonTextOutput(RoxMempool* pool) : pMempoolM(pool) {

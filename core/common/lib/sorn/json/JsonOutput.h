@@ -63,10 +63,11 @@ class JsonOutput {
     bool isSinkM;
 };
 
-/// Writes behind what stands in a byte buffer, which must be left alone until this object is gone.
+/// Writes behind what stands in a byte buffer, which must be left alone until this object is gone. A short
+/// text goes into the buffer when it is whole, so that the buffer grows once.
 class JsonBufferOutput final : public JsonOutput {
  public:
-    explicit JsonBufferOutput(ByteBuffer& buffer) : bufferM(buffer) {}
+    explicit JsonBufferOutput(ByteBuffer& buffer);
     ~JsonBufferOutput() { Close(); }
 
  private:
@@ -74,6 +75,7 @@ class JsonBufferOutput final : public JsonOutput {
     void Close();
 
     ByteBuffer& bufferM;
+    unsigned char firstM[4096];
 };
 
 /// Writes a text of its own and makes a string of it.

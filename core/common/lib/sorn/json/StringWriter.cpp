@@ -131,21 +131,21 @@ void WriteAll(Bytes p, Bytes end, JsonOutput& out) {
 
 }  // namespace
 
-unsigned char* PutEscaped(const char* bytes, size_t n, unsigned char* out) {
+unsigned char* PutWithEscapes(const char* bytes, size_t n, unsigned char* out) {
     const Bytes p = reinterpret_cast<Bytes>(bytes);
     return WritePiece(p, p + n, p + n, out);
 }
 
 void WriteQuoted(const char* bytes, size_t n, JsonOutput& out) {
-    const Bytes p = reinterpret_cast<Bytes>(bytes);
     if (n <= pieceG) [[likely]] {
         unsigned char* to = out.Room(static_cast<unsigned>(n * maxEscapedG + 2));
         *to++ = '"';
-        to = WritePiece(p, p + n, p + n, to);
+        to = PutEscaped(bytes, n, to);
         *to++ = '"';
         out.Written(to);
         return;
     }
+    const Bytes p = reinterpret_cast<Bytes>(bytes);
     out.Byte('"');
     WriteAll(p, p + n, out);
     out.Byte('"');

@@ -1,5 +1,7 @@
 #include "sorn/json/ValueWriter.h"
 
+#include <cstring>
+
 #include "rox/VkCast.h"
 #include "sorn/dict/ArrayValue.h"
 #include "sorn/dict/LazyDictValue.h"
@@ -151,6 +153,7 @@ void ValueWriter::ContinueDictionary() {
     for (; frame.next < frame.count; ++frame.next, frame.nextOfName = 0) {
         // By reference: the two words were stored one by one, and are best loaded so.
         const DictionaryEntries::Name& name = namesM[frame.firstName + frame.next];
+        if (frame.next + 2 < frame.count) __builtin_prefetch((&name)[2].GetStored());
         if (frame.next + 1 < frame.count) Prefetch((&name)[1].GetStored());
         const DictValue* const stored = name.GetStored();
         if (stored == nullptr) continue;

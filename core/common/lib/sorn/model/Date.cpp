@@ -7,10 +7,13 @@ namespace sorn {
 constinit const Date Date::ZERO;
 
 Date Date::Parse(const RoxString& text) {
+    return Parse(text.Utf8(), text.NByte());
+}
+
+Date Date::Parse(const char* text, unsigned nByte) {
     int64_t seconds = 0;
     int year = 0;
-    if (!scalartext::ParseMoment(text.Utf8(), text.NByte(), scalartext::DATE_ONLY, seconds, year))
-        return ZERO;
+    if (!scalartext::ParseMoment(text, nByte, scalartext::DATE_ONLY, seconds, year)) return ZERO;
     return Date(static_cast<int32_t>(seconds / 86400));
 }
 

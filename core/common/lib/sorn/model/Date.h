@@ -21,6 +21,8 @@ class Date {
 
     /// Reads a text such as 2037-12-31, as strptime does with "%F", used up whole; anything else gives ZERO.
     static Date Parse(const RoxString& text);
+    /// The same for nByte bytes with a NUL behind them.
+    static Date Parse(const char* text, unsigned nByte);
 
     /// Such as 2037-12-31, in the pool (null: the general heap).
     RoxString ToString(RoxMempool* pool = nullptr) const;

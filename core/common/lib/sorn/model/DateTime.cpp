@@ -9,10 +9,13 @@ namespace sorn {
 constinit const DateTime DateTime::ZERO;
 
 DateTime DateTime::Parse(const RoxString& text) {
+    return Parse(text.Utf8(), text.NByte());
+}
+
+DateTime DateTime::Parse(const char* text, unsigned nByte) {
     int64_t seconds = 0;
     int year = 0;
-    if (!scalartext::ParseMoment(text.Utf8(), text.NByte(), scalartext::DATE_AND_TIME, seconds, year))
-        return ZERO;
+    if (!scalartext::ParseMoment(text, nByte, scalartext::DATE_AND_TIME, seconds, year)) return ZERO;
     return DateTime(year >= 2038 ? clampMillisecondsG : seconds * 1000);
 }
 

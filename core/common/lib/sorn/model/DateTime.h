@@ -28,6 +28,8 @@ class DateTime {
     /// or
     /// "%FT%T", used up whole; anything else gives ZERO. Years from 2038 on give clampMillisecondsG.
     static DateTime Parse(const RoxString& text);
+    /// The same for nByte bytes with a NUL behind them.
+    static DateTime Parse(const char* text, unsigned nByte);
     /// The present moment by the system's clock.
     static DateTime Now();
 

@@ -1,9 +1,10 @@
 #include "sorn/model/ScalarText.h"
 
-#include <charconv>
 #include <cstring>
 #include <ctime>
 #include <limits>
+
+#include "sorn/model/DecimalDigits.h"
 
 namespace sorn::scalartext {
 
@@ -24,16 +25,26 @@ struct CivilDate {
 
 // Both conversions count in eras of 400 years that begin on 1 March, after H. Hinnant, "chrono-Compatible
 // Low-Level Date Algorithms".
+// The unsigned 32-bit days of all dates that occur are counted in their own width, which is what division
+// likes.
+template <class Int>
+CivilDate DateOfShiftedDays(Int days, Int era) {
+    const Int dayOfEra = days - era * 146097;
+    const Int yearOfEra = (dayOfEra - dayOfEra / 1460 + dayOfEra / 36524 - dayOfEra / 146096) / 365;
+    const Int dayOfYear = dayOfEra - (365 * yearOfEra + yearOfEra / 4 - yearOfEra / 100);
+    const Int shiftedMonth = (5 * dayOfYear + 2) / 153;
+    const int month = static_cast<int>(shiftedMonth < 10 ? shiftedMonth + 3 : shiftedMonth - 9);
+    return {int64_t{yearOfEra} + int64_t{era} * 400 + (month <= 2 ? 1 : 0), month,
+            static_cast<int>(dayOfYear - (153 * shiftedMonth + 2) / 5 + 1)};
+}
+
 CivilDate DateOfDays(int64_t days) {
     days += 719468;
-    const int64_t era = (days >= 0 ? days : days - 146096) / 146097;
-    const int64_t dayOfEra = days - era * 146097;
-    const int64_t yearOfEra = (dayOfEra - dayOfEra / 1460 + dayOfEra / 36524 - dayOfEra / 146096) / 365;
-    const int64_t dayOfYear = dayOfEra - (365 * yearOfEra + yearOfEra / 4 - yearOfEra / 100);
-    const int64_t shiftedMonth = (5 * dayOfYear + 2) / 153;
-    const int month = static_cast<int>(shiftedMonth < 10 ? shiftedMonth + 3 : shiftedMonth - 9);
-    return {yearOfEra + era * 400 + (month <= 2 ? 1 : 0), month,
-            static_cast<int>(dayOfYear - (153 * shiftedMonth + 2) / 5 + 1)};
+    if (days >= 0 && days <= INT32_MAX) [[likely]] {
+        const auto narrow = static_cast<uint32_t>(days);
+        return DateOfShiftedDays<uint32_t>(narrow, narrow / 146097);
+    }
+    return DateOfShiftedDays<int64_t>(days, (days >= 0 ? days : days - 146096) / 146097);
 }
 
 int64_t DaysOfDate(int64_t year, int month, int day) {
@@ -44,27 +55,27 @@ int64_t DaysOfDate(int64_t year, int month, int day) {
     return era * 146097 + yearOfEra * 365 + yearOfEra / 4 - yearOfEra / 100 + dayOfYear - 719468;
 }
 
-char* WriteTwoDigits(int64_t value, char* out) {
-    out[0] = static_cast<char>('0' + value / 10);
-    out[1] = static_cast<char>('0' + value % 10);
-    return out + 2;
+char* WriteYear(int64_t year, char* out) {
+    if (year >= 1000 && year <= 9999) [[likely]]
+        return decimaldigits::WriteFour(static_cast<uint32_t>(year), out);
+    return WriteDecimal(year, out);  // "%Y" does not pad
 }
 
 char* WriteDate(int64_t days, char* out) {
     const CivilDate date = DateOfDays(days);
-    out = WriteDecimal(date.year, out);  // "%Y" does not pad
+    out = WriteYear(date.year, out);
     *out++ = '-';
-    out = WriteTwoDigits(date.month, out);
+    out = decimaldigits::WriteTwo(static_cast<uint32_t>(date.month), out);
     *out++ = '-';
-    return WriteTwoDigits(date.day, out);
+    return decimaldigits::WriteTwo(static_cast<uint32_t>(date.day), out);
 }
 
-char* WriteTime(int64_t secondOfDay, char* out) {
-    out = WriteTwoDigits(secondOfDay / 3600, out);
+char* WriteTime(uint32_t secondOfDay, char* out) {
+    out = decimaldigits::WriteTwo(secondOfDay / 3600, out);
     *out++ = ':';
-    out = WriteTwoDigits(secondOfDay / 60 % 60, out);
+    out = decimaldigits::WriteTwo(secondOfDay / 60 % 60, out);
     *out++ = ':';
-    return WriteTwoDigits(secondOfDay % 60, out);
+    return decimaldigits::WriteTwo(secondOfDay % 60, out);
 }
 
 /// Reads n digits at fixed places; false when one is no digit or the number lies outside low to high.
@@ -140,8 +151,18 @@ bool ReadDecimal(const char*& p, const char* end, int32_t& value) {
 }
 
 char* WriteUnsigned(uint64_t value, char* out) {
-    constexpr int maxDigits = 20;
-    return std::to_chars(out, out + maxDigits, value).ptr;
+    constexpr uint32_t eightDigits = 100000000;
+    if (value <= UINT32_MAX) [[likely]]
+        return decimaldigits::Write(static_cast<uint32_t>(value), out);
+    const uint64_t high = value / eightDigits;
+    const auto low = static_cast<uint32_t>(value % eightDigits);
+    if (high <= UINT32_MAX) {
+        out = decimaldigits::Write(static_cast<uint32_t>(high), out);
+    } else {
+        out = decimaldigits::Write(static_cast<uint32_t>(high / eightDigits), out);
+        out = decimaldigits::WriteEight(static_cast<uint32_t>(high % eightDigits), out);
+    }
+    return decimaldigits::WriteEight(low, out);
 }
 
 char* WriteDecimal(int64_t value, char* out) {
@@ -166,7 +187,7 @@ unsigned FormatMoment(int64_t seconds, MomentParts parts, char* out) {
     char* p = out;
     if (parts != TIME_ONLY) p = WriteDate(days, p);
     if (parts == DATE_AND_TIME) *p++ = ' ';
-    if (parts != DATE_ONLY) p = WriteTime(secondOfDay, p);
+    if (parts != DATE_ONLY) p = WriteTime(static_cast<uint32_t>(secondOfDay), p);
     return static_cast<unsigned>(p - out);
 }
 

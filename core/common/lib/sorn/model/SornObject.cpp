@@ -21,8 +21,4 @@ bool SornObject::FPresent(const FieldInfo& field) const {
     return static_cast<const RefBase*>(MemberAt(field))->GetCore() != nullptr;
 }
 
-void SornObject::SetPresent(const FieldInfo& field) {
-    if (field.presenceOffset != 0) reinterpret_cast<char*>(this)[field.presenceOffset] = 1;
-}
-
 }  // namespace sorn

@@ -78,7 +78,9 @@ class SornObject : public RoxCore {
     /// reference.
     bool FPresent(const FieldInfo& field) const;
     /// Sets the presence byte of an optional field that has one.
-    void SetPresent(const FieldInfo& field);
+    void SetPresent(const FieldInfo& field) {
+        if (field.presenceOffset != 0) reinterpret_cast<char*>(this)[field.presenceOffset] = 1;
+    }
 
  protected:
     explicit SornObject(uint32_t id) : structId(id) {}

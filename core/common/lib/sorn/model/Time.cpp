@@ -7,10 +7,13 @@ namespace sorn {
 constinit const Time Time::ZERO;
 
 Time Time::Parse(const RoxString& text) {
+    return Parse(text.Utf8(), text.NByte());
+}
+
+Time Time::Parse(const char* text, unsigned nByte) {
     int64_t seconds = 0;
     int year = 0;
-    if (!scalartext::ParseMoment(text.Utf8(), text.NByte(), scalartext::TIME_ONLY, seconds, year))
-        return ZERO;
+    if (!scalartext::ParseMoment(text, nByte, scalartext::TIME_ONLY, seconds, year)) return ZERO;
     return Time(static_cast<int32_t>(seconds * 1000));
 }
 

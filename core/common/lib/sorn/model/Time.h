@@ -23,6 +23,8 @@ class Time {
 
     /// Reads a text such as 23:59:59, as strptime does with "%T", used up whole; anything else gives ZERO.
     static Time Parse(const RoxString& text);
+    /// The same for nByte bytes with a NUL behind them.
+    static Time Parse(const char* text, unsigned nByte);
 
     /// Such as 23:59:59, milliseconds dropped, in the pool (null: the general heap).
     RoxString ToString(RoxMempool* pool = nullptr) const;

@@ -52,7 +52,7 @@ uint32_t InputPointerBytesource::TakenInBlocks() const {
 }
 
 bool InputPointerBytesource::FAtEndOfBlock() const {
-    return pMemorySourceM != nullptr && (pCurrentM - pMemoryM) % blockBytesG == 0;
+    return pMemorySourceM != nullptr && static_cast<size_t>(pCurrentM - pMemoryM) % blockBytesG == 0;
 }
 
 void InputPointerBytesource::CopyToSink() {

@@ -45,7 +45,7 @@ bool ReadU64(RoxMempool* pool, InputPointerBytesource& cursor, unsigned long lon
 
 bool ReadEnum(RoxMempool* pool, InputPointerBytesource& cursor, const FieldInfo* field, unsigned& out) {
     CursorText text(pool);
-    return text.Read(cursor) && textvalue::ToEnum(*field, text.View(), out);
+    return text.Read(cursor) && textvalue::ToEnum(*field, NameKey(text.View()), out);
 }
 
 bool ReadIntId(RoxMempool* pool, InputPointerBytesource& cursor, const FieldInfo* field, unsigned& out) {

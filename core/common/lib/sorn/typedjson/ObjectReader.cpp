@@ -2,18 +2,9 @@
 
 #include <utility>
 
-#include "sorn/convert/ValueReader.h"
-#include "sorn/json/ByteClass.h"
 #include "sorn/model/Schema.h"
-#include "sorn/typedjson/TextValue.h"
 
 namespace sorn {
-
-namespace {
-
-constexpr const char* noColonG = "JSON field name must be followed by a colon.";
-
-}  // namespace
 
 ObjectReader::ObjectReader(RoxMempool* pool, InputPointerBytesource& cursor, ObjectReaderObjects objects,
                            uint64_t nInput, RoxString& error)
@@ -34,9 +25,10 @@ bool ObjectReader::ReadObject(const StructInfo* info, ref<SornObject>& out) {
         out = nullptr;
         return true;
     }
-    outermostM = MakeObject(*info);
+    const FieldIndex* const index = FieldIndex::Of(*info);
+    outermostM = MakeObject(*info, index);
     if (outermostM == nullptr) return Finish(false);
-    PushObject(*info, outermostM.get());
+    PushObject(*info, index, outermostM.get());
     if (!Finish(Run(Step::OPENED))) return false;
     out = std::move(outermostM);
     return true;
@@ -93,7 +85,7 @@ bool ObjectReader::Run(Step step) {
 }
 
 /// Makes the object that begins here, or null.
-ref<SornObject> ObjectReader::MakeObject(const StructInfo& info) {
+ref<SornObject> ObjectReader::MakeObject(const StructInfo& info, const FieldIndex* index) {
     uint32_t number;
     objectsM.Enter(number);
     if (!cursorM.FTake('{')) {
@@ -106,60 +98,15 @@ ref<SornObject> ObjectReader::MakeObject(const StructInfo& info) {
         nInputM = nInput;
     }
     ref<SornObject> object;
-    if (budgetM.Take(info)) object = info.Factory(pMempoolM);
+    const uint32_t nBytes = index != nullptr ? index->ObjectBytes() : ObjectBudget::SizeOf(info);
+    if (budgetM.TakeBytes(nBytes)) object = info.Factory(pMempoolM);
     if (object == nullptr) wordsM.Replace("Failed to create sorn object");
     return object;
 }
 
-void ObjectReader::PushObject(const StructInfo& info, SornObject* object) {
+void ObjectReader::PushObject(const StructInfo& info, const FieldIndex* index, SornObject* object) {
     wordsM.SetSilent(!stackM.FEmpty());
-    stackM.Push({&info, object, nullptr, FieldIndex::Of(info), 0, false, false});
-}
-
-/// Reads members of the object on top until it ends, or an object opens in it.
-ObjectReader::Step ObjectReader::ReadMembers(bool fBehindValue) {
-    InputPointerBytesource& cursor = cursorM;
-    Frame& frame = stackM.Top();
-    for (;; fBehindValue = true) {
-        if (fBehindValue && !cursor.FTake(',')) break;
-        // A comma may trail.
-        if (!cursor.FSkipToByte() || !byteclass::FIs(*cursor.pCurrentM, byteclass::STARTS_KEY)) break;
-        if (!textM.Read(cursor)) return FailObject("Failed to parse a fieldName key.");
-        const FieldInfo* const field = frame.pIndex != nullptr
-                                           ? frame.pIndex->Find(textM.View())
-                                           : FieldIndex::FindByWalk(*frame.pInfo, textM.View());
-        Step step;
-        if (field == nullptr) {
-            step = SkipMember(textM.View());
-        } else {
-            if (!cursor.FTake(':')) return FailObject(noColonG);
-            frame.pField = field;
-            if (field->arity == SORN_ARITY_OPTIONAL) frame.pObject->SetPresent(*field);
-            step = StartValue();
-        }
-        if (step != Step::CLOSED) return step;
-    }
-    if (!cursor.FTake('}')) return FailObject("JSON object does not end with '}'.");
-    return CloseObject();
-}
-
-/// A key that names no field.
-ObjectReader::Step ObjectReader::SkipMember(std::string_view key) {
-    RoxString kept;
-    if (cursorM.canRefillM && !wordsM.FSilent()) {
-        kept = textM.Take(pMempoolM);
-        key = kept.View();
-    }
-    if (!cursorM.FTake(':')) return FailObject(noColonG);
-    if (!cursorM.FSkipTo('{') && !cursorM.FSkipTo('[')) {
-        if (textM.Skip(cursorM)) return Step::CLOSED;
-        wordsM.AppendValueWords(levelsM, 0);
-    } else if (skipperM.SkipFieldValue()) {
-        return Step::CLOSED;
-    }
-    if (stackM.Size() > 1) return FailInnerObject();
-    wordsM.AppendKeyWords(textvalue::Terminated(key).Text());
-    return Step::FAILED;
+    stackM.Emplace(&info, object, nullptr, index, 0u, false, false);
 }
 
 ObjectReader::Step ObjectReader::StartValue() {
@@ -236,7 +183,8 @@ ObjectReader::Step ObjectReader::OpenValue(const StructInfo* info) {
     if (info == nullptr || objectsM.FNextIsNew()) return SkipValue();
     const bool wasSilent = wordsM.FSilent();
     wordsM.SetSilent(true);
-    ref<SornObject> made = MakeObject(*info);
+    const FieldIndex* const index = FieldIndex::Of(*info);
+    ref<SornObject> made = MakeObject(*info, index);
     wordsM.SetSilent(wasSilent);
     if (made == nullptr) return FailInnerObject();
     SornObject* const object = made.get();
@@ -245,10 +193,10 @@ ObjectReader::Step ObjectReader::OpenValue(const StructInfo* info) {
     } else if (!stackM.Top().isMulti) {
         const Frame& frame = stackM.Top();
         *static_cast<ref<SornObject>*>(frame.pObject->MemberAt(*frame.pField)) = std::move(made);
-    } else if (!Stored(Target(stackM.Top()).StoreReference(made))) {
+    } else if (!Stored(Target(stackM.Top()).StoreReference(std::move(made)))) {
         return FailValue();
     }
-    PushObject(*info, object);
+    PushObject(*info, index, object);
     return Step::OPENED;
 }
 
@@ -269,56 +217,6 @@ ObjectReader::Step ObjectReader::CloseObject() {
     if (stackM.FEmpty() || !FCaller()) return Step::CLOSED;
     // The caller's object gets it only now that it is whole.
     if (Stored(Target(stackM.Top()).StoreReference(outermostM))) return Step::CLOSED;
-    return FailValue();
-}
-
-bool ObjectReader::Stored(bool isStored) {
-    return isStored || wordsM.Append(ValueReader::tooManyG);
-}
-
-/// The object on top is bad.
-ObjectReader::Step ObjectReader::FailObject(const char* text) {
-    wordsM.Replace(text);
-    return stackM.Size() == 1 ? Step::FAILED : FailInnerObject();
-}
-
-/// The innermost array of the field under way has no right end.
-ObjectReader::Step ObjectReader::FailArray() {
-    if (stackM.Size() > 1) return FailInnerObject();
-    wordsM.Replace("Array must end with ']'.");
-    levelsM.Pop();
-    wordsM.AppendArrayWords(levelsM, --stackM.Top().nLevels);
-    return FailMember();
-}
-
-/// The value under way is bad.
-ObjectReader::Step ObjectReader::FailValue() {
-    if (stackM.Size() > 1) return FailInnerObject();
-    const Frame& frame = stackM.Top();
-    if (!frame.isBare) wordsM.AppendValueWords(levelsM, frame.nLevels);
-    return FailMember();
-}
-
-/// The value of the field under way is bad, and all is said of it.
-ObjectReader::Step ObjectReader::FailMember() {
-    const Frame& frame = stackM.Top();
-    if (frame.pInfo != nullptr) wordsM.AppendKeyWords(frame.pInfo->FieldName(*frame.pField));
-    return Step::FAILED;
-}
-
-/// Something is wrong in an object inside the outermost one, and all that is told of it is where that stands.
-ObjectReader::Step ObjectReader::FailInnerObject() {
-    while (stackM.Size() > 1) {
-        for (uint32_t i = stackM.Top().nLevels; i > 0; --i) levelsM.Pop();
-        stackM.Pop();
-    }
-    wordsM.SetSilent(false);
-    const Frame& frame = stackM.Top();
-    if (frame.isMulti) {
-        wordsM.Append(frame.pField->Type() == SORN_DATA_TYPE_OBJECT
-                          ? " failed to Unmarshal TYPE_OBJECT in Multi"
-                          : " failed to Unmarshal KNOWN_DICT in Multi");
-    }
     return FailValue();
 }
 

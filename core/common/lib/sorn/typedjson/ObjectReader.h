@@ -60,9 +60,11 @@ class ObjectReader {
     bool Finish(bool isGood);
     void PushCaller(const FieldInfo* field, SornObject* object);
     bool Run(Step step);
-    ref<SornObject> MakeObject(const StructInfo& info);
-    void PushObject(const StructInfo& info, SornObject* object);
+    ref<SornObject> MakeObject(const StructInfo& info, const FieldIndex* index);
+    void PushObject(const StructInfo& info, const FieldIndex* index, SornObject* object);
     Step ReadMembers(bool fBehindValue);
+    Step ReadMember(std::string_view key);
+    bool ReadPlainMember(Step& step);
     Step SkipMember(std::string_view key);
     Step StartValue();
     Step StartArray(bool isBracketed);
@@ -74,15 +76,18 @@ class ObjectReader {
     bool ReadPlainValue(const FieldInfo& field, const FieldTarget& target);
     bool ReadAnyDict(const FieldTarget& target);
     bool ReadLazy(const FieldTarget& target);
-    bool ReadText(const FieldInfo& field, const FieldTarget& target);
+    bool ReadText(const FieldInfo& field, std::string_view text, bool isRoomy, const FieldTarget& target);
     template <class Member, class Value>
-    bool StoreNumber(bool (*convert)(std::string_view, Value&), const FieldTarget& target);
+    bool StoreNumber(bool (*convert)(std::string_view, Value&), std::string_view text,
+                     const FieldTarget& target);
     template <class Scalar>
-    bool StoreValid(const FieldTarget& target);
-    bool StoreEnum(const FieldInfo& field, const FieldTarget& target);
-    bool StoreId(const FieldInfo& field, const FieldTarget& target);
+    bool StoreValid(std::string_view text, const FieldTarget& target);
+    bool StoreEnum(const FieldInfo& field, const NameKey& name, const FieldTarget& target);
+    bool StoreId(const FieldInfo& field, std::string_view text, const FieldTarget& target);
     bool StoreText(std::string_view text, const FieldTarget& target);
-    bool Stored(bool isStored);
+    RoxString Cut(std::string_view text);
+    bool Stored(bool isStored) { return isStored || FailFull(); }
+    bool FailFull();
 
     Step FailObject(const char* text);
     Step FailArray();

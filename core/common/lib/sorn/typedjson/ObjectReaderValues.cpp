@@ -22,7 +22,7 @@ bool ObjectReader::ReadPlainValue(const FieldInfo& field, const FieldTarget& tar
         case SORN_DATA_TYPE_KNOWN_DICT_AS_LAZY:
             return ReadLazy(target);
         default:
-            return textM.Read(cursorM) && ReadText(field, target);
+            return textM.Read(cursorM) && ReadText(field, textM.View(), false, target);
     }
 }
 
@@ -51,83 +51,87 @@ bool ObjectReader::ReadLazy(const FieldTarget& target) {
     return Stored(target.StoreReference(body));
 }
 
-bool ObjectReader::ReadText(const FieldInfo& field, const FieldTarget& target) {
-    const std::string_view text = textM.View();
+/// `isRoomy`: the text has as many readable bytes from its start on as NameKey::OfRoomy wants.
+bool ObjectReader::ReadText(const FieldInfo& field, std::string_view text, bool isRoomy,
+                            const FieldTarget& target) {
+    const unsigned nText = static_cast<unsigned>(text.size());
     switch (field.Type()) {
         case SORN_DATA_TYPE_STRING:
             return StoreText(text, target);
         case SORN_DATA_TYPE_STRING_ID:
         case SORN_DATA_TYPE_INT_ID:
         case SORN_DATA_TYPE_LONG_ID:
-            return StoreId(field, target);
+            return StoreId(field, text, target);
         case SORN_DATA_TYPE_ENUM:
-            return StoreEnum(field, target);
+            return StoreEnum(field, isRoomy ? NameKey::OfRoomy(text) : NameKey(text), target);
         case SORN_DATA_TYPE_BOOL:
-            return StoreNumber<bool>(textvalue::ToBool, target);
+            return StoreNumber<bool>(textvalue::ToBool, text, target);
         case SORN_DATA_TYPE_S32:
-            return StoreNumber<int32_t>(textvalue::ToS32, target);
+            return StoreNumber<int32_t>(textvalue::ToS32, text, target);
         case SORN_DATA_TYPE_S64:
-            return StoreNumber<int64_t>(textvalue::ToS64, target);
+            return StoreNumber<int64_t>(textvalue::ToS64, text, target);
         case SORN_DATA_TYPE_U32:
-            return StoreNumber<uint32_t>(textvalue::ToU32, target);
+            return StoreNumber<uint32_t>(textvalue::ToU32, text, target);
         case SORN_DATA_TYPE_U64:
-            return StoreNumber<uint64_t>(textvalue::ToU64, target);
+            return StoreNumber<uint64_t>(textvalue::ToU64, text, target);
         case SORN_DATA_TYPE_FLOAT:
-            return StoreNumber<double>(textvalue::ToFloat, target);
+            return StoreNumber<double>(textvalue::ToFloat, text, target);
         case SORN_DATA_TYPE_BYTESTRING:
             return Stored(target.StoreReference(textvalue::ToBytes(pMempoolM, text)));
         case SORN_DATA_TYPE_CHANNEL:
-            return StoreValid<ChannelNumber>(target);
+            return StoreValid<ChannelNumber>(text, target);
         case SORN_DATA_TYPE_CURRENCY:
-            return StoreValid<Currency>(target);
+            return StoreValid<Currency>(text, target);
         // What is no date or time is stored as the parser gives it: these fields cannot refuse a text.
         case SORN_DATA_TYPE_DATE:
-            return Stored(target.StorePlain(Date::Parse(textM.Take(pMempoolM))));
+            return Stored(target.StorePlain(Date::Parse(textvalue::Terminated(text).Text(), nText)));
         case SORN_DATA_TYPE_DATETIME:
-            return Stored(target.StorePlain(DateTime::Parse(textM.Take(pMempoolM))));
+            return Stored(target.StorePlain(DateTime::Parse(textvalue::Terminated(text).Text(), nText)));
         case SORN_DATA_TYPE_TIME:
-            return Stored(target.StorePlain(Time::Parse(textM.Take(pMempoolM))));
+            return Stored(target.StorePlain(Time::Parse(textvalue::Terminated(text).Text(), nText)));
         default:
             return false;
     }
 }
 
 template <class Member, class Value>
-bool ObjectReader::StoreNumber(bool (*convert)(std::string_view, Value&), const FieldTarget& target) {
+inline bool ObjectReader::StoreNumber(bool (*convert)(std::string_view, Value&), std::string_view text,
+                                      const FieldTarget& target) {
     Value value;
-    return convert(textM.View(), value) && Stored(target.StorePlain<Member>(value));
+    return convert(text, value) && Stored(target.StorePlain<Member>(value));
 }
 
 template <class Scalar>
-bool ObjectReader::StoreValid(const FieldTarget& target) {
-    const Scalar value = Scalar::Parse(textM.Take(pMempoolM));
+bool ObjectReader::StoreValid(std::string_view text, const FieldTarget& target) {
+    const Scalar value = Scalar::Parse(Cut(text));
     return value != Scalar::INVALID && Stored(target.StorePlain(value));
 }
 
-bool ObjectReader::StoreEnum(const FieldInfo& field, const FieldTarget& target) {
+bool ObjectReader::StoreEnum(const FieldInfo& field, const NameKey& name, const FieldTarget& target) {
     uint32_t value;
-    return textvalue::ToEnum(field, textM.View(), value) && Stored(target.StorePlain(value));
+    return textvalue::ToEnum(field, name, value) && Stored(target.StorePlain(value));
 }
 
-bool ObjectReader::StoreId(const FieldInfo& field, const FieldTarget& target) {
+bool ObjectReader::StoreId(const FieldInfo& field, std::string_view text, const FieldTarget& target) {
     unsigned intId;
     unsigned long long longId;
     std::string_view bare;
     switch (field.Type()) {
         case SORN_DATA_TYPE_INT_ID:
-            return textvalue::ToIntId(field, textM.View(), intId) &&
-                   Stored(target.StorePlain<uint32_t>(intId));
+            return textvalue::ToIntId(field, text, intId) && Stored(target.StorePlain<uint32_t>(intId));
         case SORN_DATA_TYPE_LONG_ID:
-            return textvalue::ToLongId(field, textM.View(), longId) &&
-                   Stored(target.StorePlain<uint64_t>(longId));
+            return textvalue::ToLongId(field, text, longId) && Stored(target.StorePlain<uint64_t>(longId));
         default:
-            return textvalue::ToStringId(field, textM.View(), bare) && StoreText(bare, target);
+            return textvalue::ToStringId(field, text, bare) && StoreText(bare, target);
     }
 }
 
+RoxString ObjectReader::Cut(std::string_view text) {
+    return CutText(pMempoolM, reinterpret_cast<const unsigned char*>(text.data()), text.size());
+}
+
 bool ObjectReader::StoreText(std::string_view text, const FieldTarget& target) {
-    return Stored(target.StoreText(
-        CutText(pMempoolM, reinterpret_cast<const unsigned char*>(text.data()), text.size())));
+    return Stored(target.StoreText(Cut(text)));
 }
 
 }  // namespace sorn

@@ -1,6 +1,9 @@
 #include "sorn/typedjson/ObjectSkipper.h"
 
+#include <cstring>
+
 #include "sorn/json/ByteClass.h"
+#include "sorn/typedjson/StructNames.h"
 #include "sorn/typedjson/TextValue.h"
 
 namespace sorn {
@@ -65,15 +68,10 @@ bool ObjectSkipper::Run(Step step) {
 }
 
 void ObjectSkipper::PushFrame(uint32_t number) {
-    Frame frame;
-    frame.pKey = nullptr;
-    if (cursorM.canRefillM) {
-        if (!keysM.has_value()) keysM.emplace(pMempoolM);
-        frame.keyBegin = keysM->GetLength();
-    }
-    frame.number = number;
-    frame.nLevels = 0;
-    stackM.Push(frame);
+    stackM.Emplace(nullptr, number, 0u);
+    if (!cursorM.canRefillM) return;
+    if (!keysM.has_value()) keysM.emplace(pMempoolM);
+    stackM.Top().keyBegin = keysM->GetLength();
 }
 
 void ObjectSkipper::PopFrame() {
@@ -98,11 +96,68 @@ ObjectSkipper::Step ObjectSkipper::OpenArray() {
     return Step::OPENED;
 }
 
+/// Passes plain members of the object on top, up to the first that is anything else. True in front of an
+/// object or array of such a member; else `fBehindValue` tells whether the cursor stands behind a value or
+/// in front of a key.
+inline bool ObjectSkipper::SkipPlainMembers(bool& fBehindValue) {
+    const unsigned char* p = cursorM.pCurrentM;
+    Frame& frame = stackM.Top();
+    const bool isTypeWanted = frame.number != noNumberG;
+    PlainMembers::Member member;
+    plainM.Enter(cursorM);
+    for (;;) {
+        if (fBehindValue) {
+            if (plainM.FEnds(p) || *p != ',') break;
+            p = plainM.BehindComma(p);
+            fBehindValue = false;
+        }
+        if (!plainM.Read(p, member)) break;
+        const bool isType =
+            isTypeWanted && member.key.size() == 4 && memcmp(member.key.data(), "type", 4) == 0;
+        if (member.pBehind == nullptr) {
+            if (isType) break;
+            KeepKey(frame, p, member.key);
+            cursorM.pCurrentM = member.pValue;
+            return true;
+        }
+        if (isType) objectsM.Note(frame.number, StructNames::Find(NameKey::OfRoomy(member.text)));
+        p = member.pBehind;
+        fBehindValue = true;
+    }
+    cursorM.pCurrentM = p;
+    return false;
+}
+
+/// The same for plain elements of the innermost array.
+inline void ObjectSkipper::SkipPlainElements(bool& fBehindValue) {
+    if (levelsM.Top() >= ObjectReaderLevel::LONE_ELEMENT) return;
+    const unsigned char* p = cursorM.pCurrentM;
+    const unsigned char* const end = cursorM.pEndM;
+    std::string_view text;
+    while (end - p > plaintext::nBehindG) {
+        if (fBehindValue) {
+            if (*p != ',') break;
+            p = plaintext::BehindComma(p, end);
+            fBehindValue = false;
+            levelsM.Top() = ObjectReaderLevel::LATER_ELEMENT;
+        } else {
+            const unsigned char* const behind = plaintext::FindText(p, end, text);
+            if (behind == nullptr) break;
+            p = behind;
+            fBehindValue = true;
+        }
+    }
+    cursorM.pCurrentM = p;
+}
+
 /// Reads members of the object on top until it ends, or an object or array opens in it.
 ObjectSkipper::Step ObjectSkipper::ReadMembers(bool fBehindValue) {
     InputPointerBytesource& cursor = cursorM;
     Frame& frame = stackM.Top();
     for (;; fBehindValue = true) {
+        if (SkipPlainMembers(fBehindValue)) {
+            return *cursor.pCurrentM == '{' ? OpenObject() : OpenArray();
+        }
         if (fBehindValue && !cursor.FTake(',')) break;
         // A comma may trail.
         if (!cursor.FSkipToByte() || !byteclass::FIs(*cursor.pCurrentM, byteclass::STARTS_KEY)) break;
@@ -134,6 +189,7 @@ ObjectSkipper::Step ObjectSkipper::ReadMembers(bool fBehindValue) {
 ObjectSkipper::Step ObjectSkipper::ReadElements(bool fBehindValue) {
     InputPointerBytesource& cursor = cursorM;
     for (;; fBehindValue = true) {
+        SkipPlainElements(fBehindValue);
         if (fBehindValue) {
             if (levelsM.Top() >= ObjectReaderLevel::LONE_ELEMENT) break;
             if (!cursor.FTake(',')) {
@@ -156,15 +212,19 @@ ObjectSkipper::Step ObjectSkipper::ReadElements(bool fBehindValue) {
     return Step::CLOSED;
 }
 
-inline bool ObjectSkipper::ReadKeyAndColon(Frame& frame, bool& isType) {
-    const unsigned char* const p = cursorM.pCurrentM;
-    if (!keyM.Read(cursorM)) return FailObject("Failed to parse a fieldName key.");
+inline void ObjectSkipper::KeepKey(Frame& frame, const unsigned char* p, std::string_view key) {
     if (!cursorM.canRefillM) {
         frame.pKey = p;
     } else {
         keysM->Truncate(frame.keyBegin);
-        keysM->AppendBytes(keyM.View().data(), static_cast<unsigned>(keyM.View().size()));
+        keysM->AppendBytes(key.data(), static_cast<unsigned>(key.size()));
     }
+}
+
+inline bool ObjectSkipper::ReadKeyAndColon(Frame& frame, bool& isType) {
+    const unsigned char* const p = cursorM.pCurrentM;
+    if (!keyM.Read(cursorM)) return FailObject("Failed to parse a fieldName key.");
+    KeepKey(frame, p, keyM.View());
     isType = frame.number != noNumberG && keyM.View() == "type";
     if (cursorM.FTake(':')) return true;
     return FailObject("JSON field name must be followed by a colon.");
@@ -172,7 +232,7 @@ inline bool ObjectSkipper::ReadKeyAndColon(Frame& frame, bool& isType) {
 
 bool ObjectSkipper::ReadType(uint32_t number) {
     if (!textM.Read(cursorM)) return false;
-    objectsM.Note(number, namesM.Find(textM.View()));
+    objectsM.Note(number, StructNames::Find(NameKey(textM.View())));
     return true;
 }
 

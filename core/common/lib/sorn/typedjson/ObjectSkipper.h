@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <optional>
+#include <string_view>
 
 #include "rox/RoxWorkStack.h"
 #include "sorn/dict/ByteBuffer.h"
@@ -10,7 +11,7 @@
 #include "sorn/typedjson/ObjectReaderLevels.h"
 #include "sorn/typedjson/ObjectReaderObjects.h"
 #include "sorn/typedjson/ObjectReaderWords.h"
-#include "sorn/typedjson/StructNames.h"
+#include "sorn/typedjson/PlainMembers.h"
 
 namespace sorn {
 
@@ -58,9 +59,11 @@ class ObjectSkipper {
     void PopFrame();
     Step OpenObject();
     Step OpenArray();
+    bool SkipPlainMembers(bool& fBehindValue);
+    void SkipPlainElements(bool& fBehindValue);
+    void KeepKey(Frame& frame, const unsigned char* p, std::string_view key);
     Step ReadMembers(bool fBehindValue);
     Step ReadElements(bool fBehindValue);
-    void KeepKey(const unsigned char* p);
     bool ReadKeyAndColon(Frame& frame, bool& isType);
     bool ReadType(uint32_t number);
     bool FailObject(const char* text);
@@ -73,7 +76,7 @@ class ObjectSkipper {
     InputPointerBytesource& cursorM;
     ObjectReaderObjects objectsM;
     ObjectReaderWords& wordsM;
-    StructNames namesM;
+    PlainMembers plainM;
     CursorText keyM;
     CursorText textM;
     RoxWorkStack<Frame, 32> stackM;

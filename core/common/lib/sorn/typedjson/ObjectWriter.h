@@ -13,7 +13,9 @@
 #include "sorn/model/FieldInfo.h"
 #include "sorn/model/OrvoVersion.h"
 #include "sorn/model/SornObject.h"
-#include "sorn/model/StructInfo.h"
+#include "sorn/typedjson/EnumTexts.h"
+#include "sorn/typedjson/WriterPlan.h"
+#include "sorn/typedjson/WriterPlans.h"
 
 namespace sorn {
 
@@ -32,7 +34,7 @@ class ObjectWriter {
  public:
     /// `pool` takes the stack when it becomes large.
     ObjectWriter(RoxMempool* pool, StructTable table, JsonOutput& out)
-        : tableM(table), outM(out), framesM(pool) {}
+        : plansM(table), outM(out), framesM(pool) {}
 
     /// Opens an object, whose struct must be in the table. It is the caller's.
     void BeginObject(const SornObject& object, OrvoVersion version) { Open(object, version, false); }
@@ -58,17 +60,21 @@ class ObjectWriter {
     static void WriteName(const char* name, size_t nName, bool& isFirst, JsonOutput& out);
 
  private:
+    using Step = WriterPlan::Step;
+
     /// An object, or the list of references of one of its repeated fields.
     struct Frame {
-        const StructInfo* pInfo;  // null for a list
+        const WriterPlan* pPlan;  // null for a list
         const SornObject* pObject;
         const FieldInfo* pField;  // that of a list
-        int32_t next;             // slot, or element
-        int32_t end;              // of the slots in front of "type" and then of all, or of the elements
-        int32_t block;            // the slot of the lowest bit of candidates
-        uint32_t candidates;      // slots before `next` that are to be looked at
-        unsigned lastName;        // bytes of the struct's names in front of the last one
+        uint32_t next;            // group, or element
+        uint32_t end;             // of the groups, or of the elements
+        uint32_t block;           // the step of the lowest bits of candidates
+        uint32_t candidates;      // steps that are to be looked at
+        uint32_t behindType;      // those behind "type", which comes first
+        unsigned anchor;          // the step that has "type" in front
         OrvoVersion version;
+        const WriterPlan::View* pView;  // null when each step is to be asked for its versions
         bool isFirst;
         bool isHeld;
         bool isTypeWritten;
@@ -77,21 +83,29 @@ class ObjectWriter {
     void Open(const SornObject& object, OrvoVersion version, bool isHeld);
     void ContinueObject();
     void ContinueList();
-    bool WriteSlots(Frame& frame);
-    void WriteType(const StructInfo& info, bool& isFirst);
-    /// These are false when they have opened something, and before a dictionary. No reference is null.
-    bool WriteSingle(const char* name, size_t nName, size_t nReadable, const FieldInfo& field,
-                     const SornObject& object, OrvoVersion version, bool& isFirst);
-    bool WriteMulti(const char* name, size_t nName, const FieldInfo& field, const SornObject& object,
-                    OrvoVersion version, bool& isFirst);
+    static void NextGroup(Frame& frame);
+    /// Writes the candidates that are left. False as WriteMember is; the frame is ready to go on then.
+    bool WriteCandidates(Frame& frame);
+    void WriteType(Frame& frame);
+    /// A field that has a value and is not written in one go. False as WriteMember is.
+    bool WriteOther(const Step& step, Frame& frame);
+    /// A field with its name, if there is anything to write. False as WriteMember is.
+    bool WriteNamed(const char* name, const Step& step, const SornObject& object, OrvoVersion version,
+                    bool& isFirst);
+    /// What is written behind the key of a member that has a value. False when it has opened something, and
+    /// before a dictionary.
+    bool WriteMember(const Step& step, const SornObject& object, OrvoVersion version);
+    void WriteList(const Step& step, const SornObject& object);
+    /// Of a reference that is not null.
     bool WriteReference(DataType type, const FieldSource& source, unsigned i, OrvoVersion version);
     bool WriteLazy(const ref<LazyDict>& body);
 
     // Values that hold no others; a value is what FieldSource gives for it (ObjectWriterValues.cpp).
 
-    static constexpr size_t maxShortNameG = 200;
     static constexpr size_t maxShortValueG = stringwriter::maxShortG * stringwriter::maxEscapedG + 2;
-    static_assert(maxShortNameG + maxShortValueG + 6 <= JsonOutput::maxRoomG);
+    static constexpr unsigned maxEntryG = WriterPlan::maxKeyG + maxShortValueG;
+    static_assert(maxEntryG <= JsonOutput::maxRoomG);
+    static_assert(EnumTexts::maxTextG + EnumTexts::nBlockG <= maxShortValueG);
 
     /// Whether the value is a string that PutShort cannot take.
     static bool FLong(DataType type, const void* value) {
@@ -99,13 +113,14 @@ class ObjectWriter {
                static_cast<const RoxString*>(value)->NByte() > stringwriter::maxShortG;
     }
     /// Writes a value that is no reference to memory with room for maxShortValueG bytes; gives the end.
-    unsigned char* PutShort(const FieldInfo& field, const void* value, unsigned char* out) const;
-    unsigned char* PutLongId(const FieldInfo& field, uint64_t id, unsigned char* out) const;
-    unsigned char* PutStringId(const FieldInfo& field, const RoxString& id, unsigned char* out) const;
-    void WriteValue(const FieldInfo& field, const void* value);
+    unsigned char* PutShort(DataType type, const Step& step, const void* value, unsigned char* out) const;
+    static unsigned char* PutEnum(const Step& step, uint32_t value, unsigned char* out);
+    unsigned char* PutLongId(const Step& step, uint64_t id, unsigned char* out) const;
+    unsigned char* PutStringId(const Step& step, const RoxString& id, unsigned char* out) const;
+    void WriteValue(const Step& step, const void* value);
     void WriteBytes(const rox::ByteBuffer& value);
 
-    StructTable tableM;
+    WriterPlans plansM;
     JsonOutput& outM;
     RoxWorkStack<Frame, 16> framesM;
     ref<Dictionary> dictionaryM;

@@ -1,4 +1,5 @@
-// The one table of data types on the way from objects to text.
+// The one table of data types on the way from objects to text, and the walk over fields that must be at one
+// with it to be fast.
 
 #include <algorithm>
 #include <cstring>
@@ -65,8 +66,19 @@ unsigned char* PutCurrency(const Currency& currency, unsigned char* out) {
     return PutQuoted(out, [&text, n](unsigned char* p) { return stringwriter::PutEscaped(text, n, p); });
 }
 
-unsigned char* PutEnum(const FieldInfo& field, uint32_t value, unsigned char* out) {
-    const EnumDef* const def = Schema::FindEnum(field.typeRef);
+/// "true" or "false".
+unsigned char* PutBool(bool value, unsigned char* out) {
+    std::memcpy(out, value ? "true\0\0\0" : "false\0\0", 8);
+    return out + (value ? 4 : 5);
+}
+
+}  // namespace
+
+unsigned char* ObjectWriter::PutEnum(const Step& step, uint32_t value, unsigned char* out) {
+    unsigned char* const end = step.pTexts != nullptr ? step.pTexts->Put(value, out) : nullptr;
+    if (end != nullptr) [[likely]]
+        return end;
+    const EnumDef* const def = Schema::FindEnum(step.pField->typeRef);
     const char* const name = def != nullptr ? def->NameOf(value) : nullptr;
     // Names are words of the schema, without anything to escape.
     if (name != nullptr) return PutQuoted(name, std::strlen(name), out);
@@ -76,18 +88,22 @@ unsigned char* PutEnum(const FieldInfo& field, uint32_t value, unsigned char* ou
     });
 }
 
-}  // namespace
-
-unsigned char* ObjectWriter::PutLongId(const FieldInfo& field, uint64_t id, unsigned char* out) const {
+unsigned char* ObjectWriter::PutLongId(const Step& step, uint64_t id, unsigned char* out) const {
+    if (step.pPrefix != nullptr) [[likely]] {
+        std::memcpy(out, step.pPrefix, WriterPlan::nPrefixBlockG);
+        out = Bytes(scalarformat::WriteLongId(id, Chars(out + step.nPrefix)));
+        *out++ = '"';
+        return out;
+    }
     // Prefixes are words of the schema, too.
-    return PutQuoted(
-        out, [&](unsigned char* p) { return p + schematext::WriteLongId(tableM, field, id, Chars(p)); });
+    return PutQuoted(out, [&](unsigned char* p) {
+        return p + schematext::WriteLongId(plansM.GetTable(), *step.pField, id, Chars(p));
+    });
 }
 
-unsigned char* ObjectWriter::PutStringId(const FieldInfo& field, const RoxString& id,
-                                         unsigned char* out) const {
+unsigned char* ObjectWriter::PutStringId(const Step& step, const RoxString& id, unsigned char* out) const {
     return PutQuoted(out, [&](unsigned char* p) {
-        const char* const prefix = schematext::IdPrefix(tableM, field);
+        const char* const prefix = schematext::IdPrefix(plansM.GetTable(), *step.pField);
         if (prefix == nullptr) return CopyShort("XXX", 3, p);
         const size_t nPrefix = std::min<size_t>(std::strlen(prefix), schematext::maxIdBytesG);
         const size_t nId = std::min<size_t>(id.NByte(), schematext::maxIdBytesG - nPrefix);
@@ -95,11 +111,12 @@ unsigned char* ObjectWriter::PutStringId(const FieldInfo& field, const RoxString
     });
 }
 
-unsigned char* ObjectWriter::PutShort(const FieldInfo& field, const void* value, unsigned char* out) const {
+inline unsigned char* ObjectWriter::PutShort(DataType type, const Step& step, const void* value,
+                                             unsigned char* out) const {
     using namespace scalartext;
-    switch (field.Type()) {
+    switch (type) {
         case SORN_DATA_TYPE_BOOL:
-            return As<unsigned char>(value) != 0 ? CopyShort("true", 4, out) : CopyShort("false", 5, out);
+            return PutBool(As<unsigned char>(value) != 0, out);
         case SORN_DATA_TYPE_CHANNEL:
             return PutScalar(As<ChannelNumber>(value), out);
         case SORN_DATA_TYPE_CURRENCY:
@@ -109,17 +126,17 @@ unsigned char* ObjectWriter::PutShort(const FieldInfo& field, const void* value,
         case SORN_DATA_TYPE_DATETIME:
             return PutScalar(As<DateTime>(value), out);
         case SORN_DATA_TYPE_ENUM:
-            return PutEnum(field, As<uint32_t>(value), out);
+            return PutEnum(step, As<uint32_t>(value), out);
         case SORN_DATA_TYPE_FLOAT:
             return PutQuoted(out, [value](unsigned char* p) {
                 return Bytes(scalarformat::WriteFloat(As<double>(value), Chars(p)));
             });
         case SORN_DATA_TYPE_INT_ID:
-            return PutLongId(field, As<uint32_t>(value), out);
+            return PutLongId(step, As<uint32_t>(value), out);
         case SORN_DATA_TYPE_LONG_ID:
-            return PutLongId(field, As<uint64_t>(value), out);
+            return PutLongId(step, As<uint64_t>(value), out);
         case SORN_DATA_TYPE_STRING_ID:
-            return PutStringId(field, As<RoxString>(value), out);
+            return PutStringId(step, As<RoxString>(value), out);
         // Numbers of 64 bits are quoted, those of 32 bits are not.
         case SORN_DATA_TYPE_S64:
             return PutQuoted(
@@ -141,6 +158,38 @@ unsigned char* ObjectWriter::PutShort(const FieldInfo& field, const void* value,
             });
         default:
             return out;
+    }
+}
+
+bool ObjectWriter::WriteCandidates(Frame& frame) {
+    const SornObject& object = *frame.pObject;
+    const bool asksVersions = frame.pView == nullptr;
+    const Step* const block = frame.pPlan->StepsFrom(frame.block);
+    JsonOutput& output = outM;
+    for (uint32_t candidates = frame.candidates; candidates != 0;) {
+        const Step& step = block[static_cast<unsigned>(__builtin_ctz(candidates))];
+        candidates &= candidates - 1;
+        if (asksVersions && !step.pField->FHoldsIn(frame.version)) continue;
+        const void* const member = step.MemberOf(object);
+        if (step.FSimple() && !FLong(DataType{step.form}, member)) [[likely]] {
+            unsigned char* const out = step.PutKey(frame.isFirst, output.Room(maxEntryG));
+            frame.isFirst = false;
+            output.Written(PutShort(DataType{step.form}, step, member, out));
+        } else if (step.FHasValue(object)) {
+            frame.candidates = candidates;  // before the frame moves
+            if (!WriteOther(step, frame)) return false;
+        }
+    }
+    frame.candidates = 0;
+    return true;
+}
+
+void ObjectWriter::WriteValue(const Step& step, const void* value) {
+    if (FLong(step.Type(), value)) [[unlikely]] {
+        const RoxString& text = As<RoxString>(value);
+        stringwriter::WriteQuoted(text.Utf8(), text.NByte(), outM);
+    } else {
+        outM.Written(PutShort(step.Type(), step, value, outM.Room(maxShortValueG)));
     }
 }
 

@@ -3,12 +3,11 @@
 #include <climits>
 #include <cstring>
 
-#include "sorn/convert/EnumNameIndex.h"
 #include "sorn/dict/Base64.h"
 #include "sorn/dict/RoxByteBuffer.h"
 #include "sorn/dict/ScalarFormat.h"
 #include "sorn/model/Schema.h"
-#include "sorn/model/StructInfoMap.h"
+#include "sorn/typedjson/EnumNames.h"
 
 namespace sorn::textvalue {
 
@@ -76,7 +75,7 @@ bool BareId(const FieldInfo& field, std::string_view text, std::string_view& bar
 
 Terminated::Terminated(std::string_view text) {
     if (text.size() < sizeof shortM) {
-        memcpy(shortM, text.data(), text.size());
+        if (!text.empty()) std::memcpy(shortM, text.data(), text.size());
         shortM[text.size()] = 0;
     } else {
         longM = RoxString::FromUtf8Bytes(nullptr, static_cast<unsigned>(text.size()), text.data());
@@ -117,9 +116,9 @@ bool ToFloat(std::string_view text, double& out) {
     return scalarformat::ScanFloat(Terminated(text).Text(), out);
 }
 
-bool ToEnum(const FieldInfo& field, std::string_view text, uint32_t& out) {
+bool ToEnum(const FieldInfo& field, const NameKey& text, uint32_t& out) {
     const EnumDef* const def = Schema::FindEnum(field.typeRef);
-    return def != nullptr && EnumNameIndex::Find(*def, Terminated(text).Text(), text.size(), out);
+    return def != nullptr && EnumNames::Find(*def, text, out);
 }
 
 bool ToIntId(const FieldInfo& field, std::string_view text, unsigned& out) {
@@ -144,10 +143,6 @@ ref<rox::ByteBuffer> ToBytes(RoxMempool* pool, std::string_view text) {
     ref<rox::ByteBuffer> bytes = base64G.Decode(pool, reinterpret_cast<const unsigned char*>(text.data()),
                                                 static_cast<unsigned>(text.size()));
     return bytes != nullptr ? bytes : rox::ByteBuffer::NewOfLength(pool, 0);
-}
-
-const StructInfo* StructOf(std::string_view name) {
-    return StructInfoMap::LookupStructByName(Terminated(name).Text());
 }
 
 }  // namespace sorn::textvalue

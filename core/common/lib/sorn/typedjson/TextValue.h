@@ -6,7 +6,7 @@
 #include "rox/RoxString.h"
 #include "rox/ref.h"
 #include "sorn/model/FieldInfo.h"
-#include "sorn/model/StructInfo.h"
+#include "sorn/typedjson/NameIndex.h"
 
 namespace rox {
 class ByteBuffer;
@@ -27,16 +27,13 @@ bool ToU32(std::string_view text, unsigned& out);
 bool ToU64(std::string_view text, unsigned long long& out);
 bool ToFloat(std::string_view text, double& out);
 /// The value of a name of the field's enumeration.
-bool ToEnum(const FieldInfo& field, std::string_view text, uint32_t& out);
+bool ToEnum(const FieldInfo& field, const NameKey& text, uint32_t& out);
 /// The id behind the prefix of the field's struct. Bad digits give 0, and succeed.
 bool ToIntId(const FieldInfo& field, std::string_view text, unsigned& out);
 bool ToLongId(const FieldInfo& field, std::string_view text, unsigned long long& out);
 bool ToStringId(const FieldInfo& field, std::string_view text, std::string_view& out);
 /// The bytes of a Base64 text, in the pool: never null, empty for a bad text.
 ref<rox::ByteBuffer> ToBytes(RoxMempool* pool, std::string_view text);
-
-/// The struct of a name, or null.
-const StructInfo* StructOf(std::string_view name);
 
 /// A text with a NUL behind it, in place while it is short.
 class Terminated {
