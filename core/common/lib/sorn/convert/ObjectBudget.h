@@ -8,8 +8,8 @@ namespace sorn {
 
 /// What a reading may spend on objects. Two bytes of input can make an object of two thousand, so that input
 /// of a few million bytes could take gigabytes; a reading counts the bytes of the objects that it makes and
-/// fails when they pass the budget. Lists of ten thousands of records that carry next to nothing pass. One thread
-/// at a time.
+/// fails when they pass the budget. Lists of ten thousands of records that carry next to nothing pass. One
+/// thread at a time.
 class ObjectBudget {
  public:
     /// Free for every reading, however short its input: 16,000 empty objects of the largest struct.

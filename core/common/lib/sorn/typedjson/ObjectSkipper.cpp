@@ -68,7 +68,7 @@ bool ObjectSkipper::Run(Step step) {
 }
 
 void ObjectSkipper::PushFrame(uint32_t number) {
-    stackM.Emplace(nullptr, number, 0u);
+    stackM.Push({{nullptr}, number, 0});
     if (!cursorM.canRefillM) return;
     if (!keysM.has_value()) keysM.emplace(pMempoolM);
     stackM.Top().keyBegin = keysM->GetLength();
