@@ -29,6 +29,17 @@ uint64_t Pattern(unsigned i, int elementSize) {
 
 }  // namespace
 
+TEST(GenericIntArrayTest, CountLiesAtItsOffset) {
+    RoxGenericIntArray array(4);
+    for (uint32_t i = 1; i <= 300; ++i) {
+        array.Add(&i);
+        uint16_t count = 0;
+        memcpy(&count, reinterpret_cast<const char*>(&array) + RoxGenericIntArray::CountOffset(),
+               sizeof count);
+        EXPECT_EQ(count, i);
+    }
+}
+
 TEST(GenericIntArrayTest, TakesSixteenBytesOnTheTarget) {
     EXPECT_EQ(sizeof(void*) == 4 ? 16u : 24u, sizeof(RoxGenericIntArray));
 }

@@ -58,6 +58,18 @@ TEST(RefTest, CopiesCountAndMovesDoNot) {
     EXPECT_EQ(1, (*a).number);
 }
 
+TEST(RefTest, FirstReferenceOnANewObject) {
+    RoxMempool pool("refs");
+    {
+        const ref<Base> a = ref<Base>::First(new (&pool) Derived);
+        EXPECT_EQ(1u, a->GetRefCount());
+        const ref<Base> b = a;
+        EXPECT_EQ(2u, a->GetRefCount());
+        EXPECT_NE(0u, pool.GetUsedBytes());
+    }
+    EXPECT_EQ(0u, pool.GetUsedBytes());
+}
+
 TEST(RefTest, TakingTheCoreGivesUpTheReference) {
     RoxMempool pool("refs");
     ref<Base> a = new (&pool) Base;

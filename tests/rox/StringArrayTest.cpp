@@ -44,6 +44,22 @@ int CompareNonsense(const RoxString*, const RoxString*) {
 
 }  // namespace
 
+TEST(StringArrayTest, AddTakesOver) {
+    RoxMempool pool("strings");
+    RoxStringArray array(&pool);
+    for (unsigned i = 0; i < RoxStringArray::maxCount; ++i) {
+        RoxString text = RoxString::Format(&pool, "%u", i);
+        const RoxStringRepN* const rep = text.GetRepN();
+        ASSERT_TRUE(array.Add(std::move(text)));
+        ASSERT_TRUE(text.FEmpty());
+        ASSERT_EQ(array[i].GetRepN(), rep);
+    }
+    RoxString more(&pool, "more");
+    EXPECT_FALSE(array.Add(std::move(more)));
+    EXPECT_EQ(array.GetCount(), RoxStringArray::maxCount);
+    EXPECT_STREQ(more.Utf8(), "more") << "a full array leaves the text where it is";
+}
+
 TEST(StringArrayTest, TakesSixteenBytesOnTheTarget) {
     EXPECT_EQ(sizeof(void*) == 4 ? 16u : 24u, sizeof(RoxStringArray));
 }

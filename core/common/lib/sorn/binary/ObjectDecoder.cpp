@@ -75,11 +75,9 @@ bool ObjectDecoder::FinishResult(bool isOpen, ref<SornObject>* out) {
 
 /// Null for an id that names no struct, and beyond the budget.
 inline ref<SornObject> ObjectDecoder::NewObject(uint32_t structId, const StructPlan*& plan) {
-    const StructInfo* const info = tableM.Find(structId);
-    if (info == nullptr) return nullptr;
-    plan = &plansM.Of(*info);
-    if (!budgetM.TakeBytes(plan->ObjectBytes())) return nullptr;
-    ref<SornObject> object = info->Factory(pMempoolM);
+    plan = plansM.Find(structId);
+    if (plan == nullptr || !budgetM.TakeBytes(plan->ObjectBytes())) return nullptr;
+    ref<SornObject> object = plan->Info().Factory(pMempoolM);
     object->SetDebugLockOwner(0);
     return object;
 }

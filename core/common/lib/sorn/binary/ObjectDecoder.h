@@ -28,11 +28,11 @@ class ObjectDecoder {
     ObjectDecoder(RoxMempool* pool, StructTable table, const unsigned char* begin, const unsigned char* end,
                   const ref<rox::ByteBuffer>* owner = nullptr)
         : pMempoolM(pool),
-          tableM(table),
           pM(begin),
           pEndM(end),
           pOwnerM(owner),
           budgetM(static_cast<uint64_t>(end - begin)),
+          plansM(table),
           stackM(pool) {}
 
     /// Fields up to the end, all of it: of a new object, or of one that is there.
@@ -79,7 +79,6 @@ class ObjectDecoder {
     const unsigned char* ReadAnyDict(const unsigned char* p, Bounds bounds, void* member, bool isMulti);
 
     RoxMempool* pMempoolM;
-    StructTable tableM;
     const unsigned char* pM;
     const unsigned char* pEndM;
     const ref<rox::ByteBuffer>* pOwnerM;

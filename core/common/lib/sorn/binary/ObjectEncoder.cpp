@@ -1,7 +1,5 @@
 #include "sorn/binary/ObjectEncoder.h"
 
-#include <algorithm>
-
 #include "rox/RoxAssert.h"
 #include "sorn/binary/AnyDictEncoder.h"
 #include "sorn/binary/LazyLevels.h"
@@ -27,9 +25,6 @@ constexpr uint32_t maxShortG = 64;
 constexpr size_t maxPlainG = maxShortG + maxHeadG;
 static_assert(ChannelNumber::maxTextBytesG <= maxShortG && Currency::maxTextBytesG <= maxShortG);
 static_assert(maxShortG < 0x80);
-
-/// Fields that are looked at together: a bit of a word for each.
-constexpr uint32_t nCandidatesG = 64;
 
 const void* MemberOf(const SornObject& object, const PlannedField& field) {
     return reinterpret_cast<const unsigned char*>(&object) + field.storageOffset;
@@ -94,7 +89,7 @@ void ObjectEncoder::Fields(const StructInfo& info, const SornObject& object) {
     Frame frame{};
     frame.pObject = &object;
     frame.pPlan = &plansM.Of(info);
-    frame.nLeft = frame.pPlan->NFields();
+    frame.nGroupsLeft = frame.pPlan->NGroups();
     stackM.Push(frame);
     Run();
 }
@@ -156,17 +151,15 @@ bool ObjectEncoder::StepFields() {
     unsigned char* p = outM.Begin();
     for (;;) {
         while (candidates == 0) {
-            if (frame.nLeft == 0) {
+            if (frame.nGroupsLeft == 0) {
                 outM.Commit(p);
                 return false;
             }
-            const uint32_t n = std::min(frame.nLeft, nCandidatesG);
-            frame.nLeft -= n;
-            candidates = plan->FindSet(object, frame.nLeft, n);
+            candidates = plan->FindSet(object, --frame.nGroupsLeft);
         }
         const auto bit = 63 - static_cast<uint32_t>(__builtin_clzll(candidates));
         candidates ^= uint64_t{1} << bit;
-        const PlannedField& field = plan->Field(frame.nLeft + bit);
+        const PlannedField& field = plan->Slot(frame.nGroupsLeft * StructPlan::nGroupG + bit);
         const unsigned char* const member = object + field.storageOffset;
         p = outM.Room(p, maxPlainG);
         switch (field.kind) {
@@ -262,10 +255,9 @@ bool ObjectEncoder::OpenLazyBody(const ref<LazyDict>& body, const PlannedField* 
 /// Takes over a hold on `held`, which may be null.
 inline void ObjectEncoder::Open(const SornObject& object, Form form, const PlannedField* headTag,
                                 RoxCore* held, uint32_t nLazyLevels) {
-    const StructInfo* const info = tableM.Find(object.structId);
-    RoxAssert(info != nullptr, "the object is of a struct of the schema");
-    const StructPlan& plan = plansM.Of(*info);
-    stackM.Emplace(&object, &plan, uint64_t{0}, plan.NFields(), uint32_t{0},
+    const StructPlan* const plan = plansM.Find(object.structId);
+    RoxAssert(plan != nullptr, "the object is of a struct of the schema");
+    stackM.Emplace(&object, plan, uint64_t{0}, plan->NGroups(), uint32_t{0},
                    static_cast<const PlannedField*>(nullptr), headTag, outM.Count(), held, nLazyLevels, form);
 }
 

@@ -28,7 +28,7 @@ class ObjectEncoder {
 
     /// Writes into the buffer; what the walk needs is made in the pool.
     ObjectEncoder(RoxMempool* pool, StructTable table, ReverseBuffer& out)
-        : pMempoolM(pool), tableM(table), outM(out), stackM(pool) {}
+        : pMempoolM(pool), tableM(table), outM(out), plansM(table), stackM(pool) {}
     ~ObjectEncoder();
 
     void Object(const SornObject& object, Form form);
@@ -46,8 +46,8 @@ class ObjectEncoder {
     struct Frame {
         const SornObject* pObject;
         const StructPlan* pPlan;       ///< null for a frame of one field
-        uint64_t candidates;           ///< of the fields from nLeft on: those that are left and have values
-        uint32_t nLeft;                ///< the fields below it are left, apart from those of `candidates`
+        uint64_t candidates;           ///< fields that are left of the group under way and have values
+        uint32_t nGroupsLeft;          ///< groups of fields that are left; then comes the one under way
         uint32_t nElements;            ///< elements that are left of the field of objects under way
         const PlannedField* pField;    ///< that field
         const PlannedField* pHeadTag;  ///< whose tag stands before the object; null for none

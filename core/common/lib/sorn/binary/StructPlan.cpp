@@ -9,7 +9,7 @@
 #include "sorn/binary/WireFormat.h"
 #include "sorn/convert/FieldAccess.h"
 #include "sorn/convert/ObjectBudget.h"
-#include "sorn/model/StructInfoMap.h"
+#include "sorn/model/Schema.h"
 
 namespace sorn {
 
@@ -23,9 +23,20 @@ class PlansDestructor {
 
 const PlansDestructor destructorG;
 
-template <class T>
-T* NewArray(uint32_t n) {
-    return static_cast<T*>(RoxMempool::CallocIn(nullptr, std::max<size_t>(n, 1) * sizeof(T)));
+uint32_t WordOf(const FieldInfo& field) {
+    return field.presenceOffset / uint32_t{sizeof(size_t)};
+}
+
+/// Words with presence bytes, those of several groups counted for each.
+uint32_t CountPresenceWords(const StructInfo& info, uint32_t nSlots) {
+    uint32_t n = 0;
+    for (uint32_t slot = 0; slot < nSlots; ++slot) {
+        const FieldInfo* const field = info.vFieldInfo + slot;
+        const FieldInfo* const group = field - slot % StructPlan::nGroupG;
+        const auto isSame = [field](const FieldInfo& other) { return WordOf(other) == WordOf(*field); };
+        if (field->presenceOffset != 0 && std::none_of(group, field, isSame)) ++n;
+    }
+    return n;
 }
 
 }  // namespace
@@ -37,50 +48,71 @@ PlannedField::PlannedField(const FieldInfo& field, uint32_t tag) : PlannedField(
     varint::Write(tag, tagBytes + sizeof tagBytes - nTagBytes);
 }
 
-StructPlan::Test StructPlan::TestOf(const FieldInfo& field) {
-    static_assert(__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__, "bytes are picked out of words");
-    const auto part = [](size_t offset, size_t mask) {
-        const size_t inWord = offset % sizeof(size_t);
-        return Test{mask << 8 * inWord, offset - inWord};
-    };
-    constexpr Test alwaysSet{SIZE_MAX, 0};  // the pointer to the object's virtual table
-    if (field.presenceOffset != 0) return part(field.presenceOffset, UINT8_MAX);
-    const FieldStorage storage = StorageOf(field.Type());
-    if (storage == FieldStorage::PLAIN) {
-        if (field.arity != SORN_ARITY_MULTI) return alwaysSet;
-        return part(field.storageOffset + RoxGenericIntArray::CountOffset(), UINT16_MAX);
-    }
-    if (storage == FieldStorage::TEXT && field.arity == SORN_ARITY_REQUIRED) return alwaysSet;
-    // References are written only when they are not null. Containers with values have storage, which their
-    // first word leads to.
-    return {SIZE_MAX, field.storageOffset};
+StructPlan* StructPlan::New(const StructInfo& info) {
+    const auto nSlots = static_cast<uint32_t>(std::max(info.nFields, 0));
+    const uint32_t nGroups = (nSlots + nGroupG - 1) / nGroupG;
+    const uint32_t nPresence = CountPresenceWords(info, nSlots);
+    static_assert(sizeof(StructPlan) % alignof(PresenceWord) == 0 && sizeof(Group) % alignof(uint64_t) == 0 &&
+                  sizeof(PlannedField) % alignof(uint64_t) == 0);
+    const size_t nBytes = sizeof(StructPlan) + nGroups * sizeof(Group) + nPresence * sizeof(PresenceWord) +
+                          nSlots * (sizeof(PlannedField) + sizeof(MemberTest));
+    return new (RoxMempool::CallocIn(nullptr, nBytes)) StructPlan(info, nPresence);
 }
 
-StructPlan::StructPlan(const StructInfo& info)
+StructPlan::StructPlan(const StructInfo& info, uint32_t nPresence)
     : infoM(info),
       nObjectBytesM(ObjectBudget::SizeOf(info)),
       nSlotsM(static_cast<uint32_t>(std::max(info.nFields, 0))),
-      vSlotM(NewArray<PlannedField>(nSlotsM)),
-      vFieldM(NewArray<PlannedField>(nSlotsM)),
-      vTestM(NewArray<Test>(nSlotsM)) {
+      nGroupsM((nSlotsM + nGroupG - 1) / nGroupG) {
+    auto* presence = reinterpret_cast<PresenceWord*>(Groups() + nGroupsM);
+    vSlotM = reinterpret_cast<PlannedField*>(presence + nPresence);
+    auto* members = reinterpret_cast<MemberTest*>(vSlotM + nSlotsM);
     for (uint32_t slot = 0; slot < nSlotsM; ++slot) {
+        Group& group = Groups()[slot / nGroupG];
+        if (slot % nGroupG == 0) group = {0, 0, presence, presence, members, members};
         const FieldInfo& field = info.vFieldInfo[slot];
         vSlotM[slot] = PlannedField();
         if (field.FHole()) continue;
-        const uint32_t tag = wireformat::TagOf(slot, wireformat::WireTypeOf(field.dataType));
-        vSlotM[slot] = vFieldM[nFieldsM] = PlannedField(field, tag);
-        vTestM[nFieldsM++] = TestOf(field);
+        vSlotM[slot] = PlannedField(field, wireformat::TagOf(slot, wireformat::WireTypeOf(field.dataType)));
+        AddToGroup(field, slot);
+        presence = group.pPresenceEnd;
+        members = group.pMembersEnd;
     }
 }
 
-StructPlan::~StructPlan() {
-    RoxMempool::FreeIn(nullptr, vSlotM);
-    RoxMempool::FreeIn(nullptr, vFieldM);
-    RoxMempool::FreeIn(nullptr, vTestM);
+void StructPlan::AddToGroup(const FieldInfo& field, uint32_t slot) {
+    static_assert(__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__, "bytes are picked out of words");
+    Group& group = Groups()[slot / nGroupG];
+    const auto bit = static_cast<uint16_t>(slot % nGroupG);
+    const FieldStorage storage = StorageOf(field.Type());
+    const bool isMulti = field.arity == SORN_ARITY_MULTI;
+    const bool isRequired = field.arity == SORN_ARITY_REQUIRED;
+    if (storage != FieldStorage::PLAIN) group.leadsAway |= uint64_t{1} << bit;
+    if (field.presenceOffset != 0) {
+        AddPresence(group, field.presenceOffset, bit);
+    } else if (storage == FieldStorage::PLAIN && isMulti) {
+        const size_t count = field.storageOffset + RoxGenericIntArray::CountOffset();
+        const size_t inWord = count % sizeof(size_t);
+        *group.pMembersEnd++ = {size_t{UINT16_MAX} << 8 * inWord, static_cast<uint16_t>(count - inWord), bit};
+    } else if (storage == FieldStorage::PLAIN || (storage == FieldStorage::TEXT && isRequired)) {
+        group.alwaysSet |= uint64_t{1} << bit;
+    } else {
+        // References are written only when they are not null. Containers with values have storage, which
+        // their first word leads to.
+        *group.pMembersEnd++ = {SIZE_MAX, field.storageOffset, bit};
+    }
 }
 
-StructPlan* StructPlan::New(const StructInfo& info) {
-    return new (RoxMempool::MallocIn(nullptr, sizeof(StructPlan))) StructPlan(info);
+void StructPlan::AddPresence(Group& group, uint32_t offset, uint32_t bit) {
+    const uint32_t inWord = offset % sizeof(size_t);
+    const uint32_t begin = offset - inWord;
+    PresenceWord* const word =
+        std::find_if(group.pPresence, group.pPresenceEnd,
+                     [begin](const PresenceWord& each) { return each.offset == begin; });
+    if (word == group.pPresenceEnd) *group.pPresenceEnd++ = PresenceWord{{}, begin};
+    for (uint32_t nibble = 0; nibble < 16; ++nibble) {
+        if ((nibble >> inWord % 4 & 1) != 0) word->vSet[inWord / 4][nibble] |= uint64_t{1} << bit;
+    }
 }
 
 void StructPlan::Delete(StructPlan* plan) {
@@ -88,26 +120,27 @@ void StructPlan::Delete(StructPlan* plan) {
     RoxMempool::FreeIn(nullptr, plan);
 }
 
-// Two threads may make the same plan at once: one of them puts it in its place, the other drops its own.
-const StructPlan& StructPlans::Find(const StructInfo& info) {
-    if (StructInfoMap::LookupStructByName(info.name) != &info) return FindOwn(info);
-    size_t place = PlaceOf(info);
-    for (unsigned i = 0; i < nProbesG; ++i, place = (place + 1) % nPlacesG) {
-        StructPlan* found = vPlanG[place].load(std::memory_order_acquire);
-        if (found == nullptr) {
-            StructPlan* const plan = StructPlan::New(info);
-            if (vPlanG[place].compare_exchange_strong(found, plan, std::memory_order_acq_rel,
-                                                      std::memory_order_acquire)) {
-                return *plan;
-            }
-            StructPlan::Delete(plan);
-        }
-        if (&found->infoM == &info) return *found;
-    }
-    return FindOwn(info);
+StructPlans::StructPlans(StructTable table) : tableM(table), nSharedM(0) {
+    const bool isSchema = table.vStructDef == Schema::vStructDefG && table.nStructDef == Schema::nStructDefG;
+    if (isSchema) nSharedM = std::min(table.nStructDef, nPlacesG);
 }
 
-const StructPlan& StructPlans::FindOwn(const StructInfo& info) {
+// Two threads may make the same plan at once: one of them puts it in its place, the other drops its own.
+const StructPlan* StructPlans::FindSlowly(uint32_t structId) {
+    const StructInfo* const info = tableM.Find(structId);
+    if (info == nullptr) return nullptr;
+    if (structId >= nSharedM) return &Of(*info);
+    StructPlan* found = nullptr;
+    StructPlan* const plan = StructPlan::New(*info);
+    if (vPlanG[structId].compare_exchange_strong(found, plan, std::memory_order_acq_rel,
+                                                 std::memory_order_acquire)) {
+        return plan;
+    }
+    StructPlan::Delete(plan);
+    return found;
+}
+
+const StructPlan& StructPlans::Of(const StructInfo& info) {
     for (const StructPlan* plan = ownM; plan != nullptr; plan = plan->pNextM) {
         if (&plan->infoM == &info) return *plan;
     }

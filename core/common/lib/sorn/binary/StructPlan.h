@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <cstring>
 
+#include "sorn/convert/StructTable.h"
 #include "sorn/model/StructInfo.h"
 
 namespace sorn {
@@ -46,8 +47,7 @@ struct PlannedField {
     uint8_t nTagBytes = 0;
 };
 
-/// A struct's metadata in the form in which the codec walks it: worked out once for a struct, never changed,
-/// and shared by the whole process on the general heap.
+/// A struct's metadata in the form in which the codec walks it. Never changes. One block of the general heap.
 class StructPlan {
  public:
     StructPlan(const StructPlan&) = delete;
@@ -56,57 +56,102 @@ class StructPlan {
     const StructInfo& Info() const { return infoM; }
     /// What ObjectBudget counts for an object.
     uint32_t ObjectBytes() const { return nObjectBytesM; }
-
     uint32_t NSlots() const { return nSlotsM; }
     const PlannedField& Slot(uint32_t slot) const { return vSlotM[slot]; }
 
-    // The fields without the holes, in the order of their slots.
-
-    uint32_t NFields() const { return nFieldsM; }
-    const PlannedField& Field(uint32_t i) const { return vFieldM[i]; }
-    /// Of the n fields from `first` on, 64 at most: a bit for each that has a value in the object. A bit may
-    /// stand for a repeated field without values, too. Without a branch for each field, since which fields
-    /// are set cannot be foretold.
-    uint64_t FindSet(const void* object, uint32_t first, uint32_t n) const {
-        uint64_t isSet = 0;
-        for (const Test* test = vTestM + first + n; test-- != vTestM + first;) {
-            size_t word;
-            std::memcpy(&word, static_cast<const char*>(object) + test->offset, sizeof word);
-            isSet = isSet * 2 + ((word & test->mask) != 0);
+    /// Slots that are looked at together.
+    static constexpr uint32_t nGroupG = 64;
+    uint32_t NGroups() const { return nGroupsM; }
+    /// A bit for each slot of a group whose field has a value in the object; the bit may stand for a repeated
+    /// field without values, too. Without a branch for each field, since which fields are set cannot be
+    /// foretold.
+    uint64_t FindSet(const void* object, uint32_t iGroup) const {
+        const Group& group = Groups()[iGroup];
+        uint64_t isSet = group.alwaysSet;
+        for (const PresenceWord* word = group.pPresence; word != group.pPresenceEnd; ++word) {
+            const size_t bytes = LoadWord(object, word->offset);
+            if (bytes == 0) continue;
+            const uint64_t bits = NonZeroBytes(bytes);
+            isSet |= word->vSet[0][bits % 16];
+            if constexpr (nNibblesG == 2) isSet |= word->vSet[nNibblesG - 1][bits / 16];
         }
+        for (const MemberTest* test = group.pMembers; test != group.pMembersEnd; ++test) {
+            isSet |= uint64_t{(LoadWord(object, test->offset) & test->mask) != 0} << test->bit;
+        }
+        Prefetch(object, iGroup, isSet & group.leadsAway);
         return isSet;
     }
 
  private:
     friend class StructPlans;
-    /// A field has a value when a bit of the mask is set in the word at the offset in its object.
-    struct Test {
-        size_t mask;
+    static constexpr unsigned nNibblesG = sizeof(size_t) / 4;
+    /// As many presence bytes as a word has: what the fields of four of them that are set add to the result.
+    struct PresenceWord {
+        uint64_t vSet[nNibblesG][16];
         size_t offset;
     };
+    /// A field without presence byte has a value when a bit of the mask is set in the word at the offset.
+    struct MemberTest {
+        size_t mask;
+        uint16_t offset;
+        uint16_t bit;
+    };
+    struct Group {
+        uint64_t alwaysSet;
+        uint64_t leadsAway;  ///< the fields whose member begins with a pointer
+        PresenceWord* pPresence;
+        PresenceWord* pPresenceEnd;
+        MemberTest* pMembers;
+        MemberTest* pMembersEnd;
+    };
 
-    explicit StructPlan(const StructInfo& info);
-    ~StructPlan();
+    /// Has what the fields' members lead to brought near, all at once: in a large tree the waiting for memory
+    /// is what writing takes.
+    void Prefetch(const void* object, uint32_t iGroup, uint64_t fields) const {
+        const PlannedField* const group = vSlotM + iGroup * nGroupG;
+        for (; fields != 0; fields &= fields - 1) {
+            const void* p;
+            const uint16_t offset = group[__builtin_ctzll(fields)].storageOffset;
+            std::memcpy(&p, static_cast<const char*>(object) + offset, sizeof p);
+            __builtin_prefetch(p);
+        }
+    }
+    static size_t LoadWord(const void* object, size_t offset) {
+        size_t word;
+        std::memcpy(&word, static_cast<const char*>(object) + offset, sizeof word);
+        return word;
+    }
+    /// A bit for each byte of the word, the lowest for the first one.
+    static uint64_t NonZeroBytes(uint64_t word) {
+        constexpr uint64_t lowBits = 0x7F7F7F7F7F7F7F7F;
+        const uint64_t tops = (((word & lowBits) + lowBits) | word) & ~lowBits;
+        return (tops >> 7) * 0x0102040810204080 >> 56;
+    }
+
+    StructPlan(const StructInfo& info, uint32_t nPresence);
+    ~StructPlan() = default;
     static StructPlan* New(const StructInfo& info);
     static void Delete(StructPlan* plan);
-    static Test TestOf(const FieldInfo& field);
+    void AddToGroup(const FieldInfo& field, uint32_t slot);
+    static void AddPresence(Group& group, uint32_t offset, uint32_t bit);
+    // The groups lie right behind the plan, so that no pointer leads to them; then the rest.
+    Group* Groups() { return reinterpret_cast<Group*>(this + 1); }
+    const Group* Groups() const { return reinterpret_cast<const Group*>(this + 1); }
 
     const StructInfo& infoM;
     uint32_t nObjectBytesM;
     uint32_t nSlotsM;
-    uint32_t nFieldsM = 0;
+    uint32_t nGroupsM;
     PlannedField* vSlotM;
-    PlannedField* vFieldM;
-    Test* vTestM;
     StructPlan* pNextM = nullptr;  // in the list of one StructPlans
 };
 
-/// Where a walk gets its plans from. Those of the schema's structs are made by the first question and kept
-/// for the process, without a lock. Those of other structs, whose metadata may end before the process does,
-/// live as long as this. One thread at a time.
+/// Where a walk over objects of a table's structs gets its plans from. Those of the schema's are made by the
+/// first question and kept for the process, without a lock; those of other tables, whose metadata may end
+/// before the process does, live as long as this. One thread at a time.
 class StructPlans {
  public:
-    StructPlans() = default;
+    explicit StructPlans(StructTable table);
     StructPlans(const StructPlans&) = delete;
     StructPlans& operator=(const StructPlans&) = delete;
     ~StructPlans() {
@@ -114,33 +159,33 @@ class StructPlans {
             DeleteOwn();
     }
 
-    const StructPlan& Of(const StructInfo& info) {
-        const StructPlan* const plan = vPlanG[PlaceOf(info)].load(std::memory_order_acquire);
-        if (plan != nullptr && &plan->infoM == &info) [[likely]]
-            return *plan;
-        return Find(info);
+    /// The plan of the struct with this id; null for an id that names none.
+    const StructPlan* Find(uint32_t structId) {
+        if (structId < nSharedM) [[likely]] {
+            const StructPlan* const plan = vPlanG[structId].load(std::memory_order_acquire);
+            if (plan != nullptr) [[likely]]
+                return plan;
+        }
+        return FindSlowly(structId);
     }
+    /// The plan of any struct.
+    const StructPlan& Of(const StructInfo& info);
 
     /// Deletes the plans of the schema's structs. Not while anybody uses one. At the end of the process it
     /// happens by itself.
     static void DestroyAll();
 
  private:
-    static constexpr unsigned nPlaceBitsG = 10;  // room for all structs of the schema
-    static constexpr size_t nPlacesG = size_t{1} << nPlaceBitsG;
-    static constexpr unsigned nProbesG = 16;
+    /// Room for all structs of the schema, by their ids.
+    static constexpr uint32_t nPlacesG = 8192;
 
-    /// Structs lie one behind another: multiplication spreads what the low bits have.
-    static size_t PlaceOf(const StructInfo& info) {
-        const uint64_t address = reinterpret_cast<uintptr_t>(&info) / alignof(StructInfo);
-        return static_cast<size_t>(address * 0x9E3779B97F4A7C15 >> (64 - nPlaceBitsG));
-    }
-    const StructPlan& Find(const StructInfo& info);
-    const StructPlan& FindOwn(const StructInfo& info);
+    const StructPlan* FindSlowly(uint32_t structId);
     void DeleteOwn();
 
     static std::atomic<StructPlan*> vPlanG[nPlacesG];
 
+    StructTable tableM;
+    uint32_t nSharedM;  // ids below it have their plans in vPlanG
     StructPlan* ownM = nullptr;
 };
 
