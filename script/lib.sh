@@ -21,3 +21,9 @@ build_preset() {
     cmake --build --preset "$preset" "$@"
 }
 mkdir -p build
+
+# What was compiled before, in whatever checkout, is not compiled again.
+if command -v ccache >/dev/null; then
+    export CMAKE_CXX_COMPILER_LAUNCHER=ccache CCACHE_BASEDIR=$PWD CCACHE_NOHASHDIR=1 CCACHE_MAXSIZE=8G
+    export CCACHE_SLOPPINESS=time_macros,include_file_mtime,include_file_ctime
+fi
