@@ -29,11 +29,19 @@ Tree Tree::Array() {
     return tree;
 }
 
+Tree Tree::Dict() {
+    return Tree();
+}
+
 Tree Tree::OfBody(const std::shared_ptr<const Body>& body) {
     Tree tree;
     tree.kind = isBody;
     tree.body = body;
     return tree;
+}
+
+void Tree::Add(const std::string& name, const Tree& value) {
+    entries.push_back({name, value});
 }
 
 const Tree* Tree::Find(const std::string& name) const {

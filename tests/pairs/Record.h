@@ -17,6 +17,7 @@ namespace sorntest {
 
 struct Record;
 struct Tree;
+struct TreeEntry;
 
 /// A body that defers its form; `rep` is the number of LazyDict::Rep.
 struct Body {
@@ -37,21 +38,26 @@ struct Tree {
     bool quoted = true;
     std::string text;
     std::vector<Tree> items;
-    std::vector<std::pair<std::string, Tree>> entries;  ///< in the order of addition, names repeated
+    std::vector<TreeEntry> entries;  ///< in the order of addition, names repeated
     std::shared_ptr<const Body> body;
     std::string raw;  ///< of a dictionary that was read: its text
 
     static Tree Text(const std::string& text, bool quoted = true);
     static Tree Null();
     static Tree Array();
-    static Tree Dict() { return Tree(); }
+    static Tree Dict();
     static Tree OfBody(const std::shared_ptr<const Body>& body);
 
-    void Add(const std::string& name, const Tree& value) { entries.emplace_back(name, value); }
+    void Add(const std::string& name, const Tree& value);
     /// The first value of a name, or null.
     const Tree* Find(const std::string& name) const;
     /// Names in byte order, each with its values in the order of addition.
     std::map<std::string, std::vector<const Tree*>> Sorted() const;
+};
+
+struct TreeEntry {
+    std::string name;
+    Tree value;
 };
 
 /// One value of a field; which members count follows from the field's data type.

@@ -72,7 +72,7 @@ class TypedReader {
     static size_t CountDicts(const Tree& tree) {
         size_t count = tree.kind == Tree::isDict ? 1 : 0;
         for (const Tree& item : tree.items) count += CountDicts(item);
-        for (const auto& entry : tree.entries) count += CountDicts(entry.second);
+        for (const auto& entry : tree.entries) count += CountDicts(entry.value);
         return count;
     }
 
