@@ -1,4 +1,4 @@
-// Slices of byte buffers, and bodies that share a record's bytes.
+// Slices of byte buffers, and bodies that share a record's bytes. Invariants for untrusted input: 1, 12.
 
 #include "binary/BinaryFixture.h"
 #include "sorn/lazy/LazyDict.h"
@@ -99,6 +99,53 @@ TEST_F(ByteBufferSliceTest, BodiesOfARecord) {
     const auto& copied = static_cast<sornschema::EveryTypeLazy&>(*object);
     EXPECT_EQ(copied.body->GetStoredBytes()->GetOwner(), nullptr);
     EXPECT_EQ(Hex(*copied.body->GetStoredBytes()), "7B 7D");
+}
+
+/// Bytes of another pool than the result's: that pool may end first.
+TEST_F(ByteBufferSliceTest, BodiesOutliveTheBytesOfAnotherPool) {
+    // Two bodies, one in the other: the inner one has a number.
+    const std::string bytes = Bytes("A2 F2 02 0E 12 0C A2 F2 02 08 12 06 FA F1 02 02 38 06");
+    const auto n = static_cast<uint32_t>(bytes.size());
+    const auto bodyOf = [](const ref<SornObject>& object) {
+        return static_cast<const sornschema::EveryTypeLazy&>(*object).body;
+    };
+    ref<SornObject> object;
+    {
+        RoxMempool other("other");
+        const ref<ByteBuffer> buffer = ByteBuffer::New(&other, bytes.data(), n);
+        ASSERT_TRUE(Codec().UnmarshalKnownDict(buffer, &object));
+        EXPECT_EQ(buffer->GetRefCount(), 1u);
+        EXPECT_EQ(bodyOf(object)->GetStoredBytes()->GetMempool(), &pool);
+        EXPECT_EQ(bodyOf(object)->GetStoredBytes()->GetOwner(), nullptr);
+    }
+    EXPECT_EQ(Hex(*bodyOf(object)->GetStoredBytes()), "A2 F2 02 08 12 06 FA F1 02 02 38 06");
+    // The body inside shares the copy.
+    ref<SornObject> inner = bodyOf(object)->ToSornObjectOrError();
+    EXPECT_EQ(bodyOf(inner)->GetStoredBytes()->GetOwner(), bodyOf(object)->GetStoredBytes());
+    EXPECT_EQ(Hex(*bodyOf(inner)->GetStoredBytes()), "FA F1 02 02 38 06");
+    inner = nullptr;
+    {
+        // What counts is where the bytes lie, not where the slice does.
+        RoxMempool other("other");
+        const ref<ByteBuffer> slice =
+            ByteBuffer::NewSlice(&pool, ByteBuffer::New(&other, bytes.data(), n), 0, n);
+        ASSERT_TRUE(Codec().UnmarshalKnownDict(slice, &object));
+        EXPECT_EQ(bodyOf(object)->GetStoredBytes()->GetOwner(), nullptr);
+    }
+    EXPECT_EQ(FieldsOf(object), "12 0C A2 F2 02 08 12 06 FA F1 02 02 38 06");
+}
+
+TEST_F(ByteBufferSliceTest, BodiesShareTheBytesOfTheGeneralHeap) {
+    const std::string bytes = Bytes("A2 F2 02 04 12 02 7B 7D");
+    ref<SornObject> object;
+    {
+        const ref<ByteBuffer> buffer =
+            ByteBuffer::New(nullptr, bytes.data(), static_cast<uint32_t>(bytes.size()));
+        ASSERT_TRUE(Codec().UnmarshalKnownDict(buffer, &object));
+        EXPECT_EQ(static_cast<sornschema::EveryTypeLazy&>(*object).body->GetStoredBytes()->GetOwner(),
+                  buffer);
+    }
+    EXPECT_EQ(Hex(*static_cast<sornschema::EveryTypeLazy&>(*object).body->GetStoredBytes()), "7B 7D");
 }
 
 }  // namespace sorntest

@@ -1,4 +1,5 @@
-// The forms around values: objects, known dicts, bodies, dictionaries without a schema.
+// The forms around values: objects, known dicts, bodies, dictionaries without a schema. Invariant for
+// untrusted input: 12.
 
 #include "binary/ValueRows.h"
 #include "sorn/dict/ArrayValue.h"
@@ -75,6 +76,16 @@ TEST_F(MarshalTest, PresentAndEmpty) {
 /// Required fields go out whatever they hold: plainId in slot 1.
 TEST_F(MarshalTest, RequiredFieldAtItsDefault) {
     EXPECT_EQ(FieldsOf(sornschema::EveryTypePlain::Factory(&pool)), "08 00");
+}
+
+/// 0x64, which the section stream escapes, as a tag, as a length of 100 and as a text's bytes: single at the
+/// end.
+TEST_F(MarshalTest, TheEscapeOfTheStreamIsNotSeen) {
+    const OneFieldStruct one("multiString");
+    const ref<SornObject> object = EveryType::Factory(&pool);
+    FieldTarget(object->MemberAt(one.Field()), true).StoreText(RoxString(std::string(100, 'd').c_str()));
+    EXPECT_EQ(Written([&](Stream& s) { Codec().MarshalMultiField(0x64, &one.Field(), object.get(), s); }),
+              Hex(std::string(102, 'd')));
 }
 
 TEST_F(MarshalTest, ObjectsInObjects) {

@@ -1,7 +1,6 @@
-// Reading: what is taken, what is refused, and what is said about unknown fields. Invariants for untrusted
-// input: 1, 2, 6, 8, 9.
+// Reading: what is taken and what is refused. Invariants for untrusted input: 1, 2, 6, 8, 9.
 
-#include "binary/ValueRows.h"
+#include "binary/UnmarshalFixture.h"
 #include "sornschema/EveryTypeLazy.h"
 #include "sornschema/EveryTypePlain.h"
 
@@ -13,118 +12,7 @@ using sornschema::EveryTypeCompanion;
 using sornschema::EveryTypeLazy;
 using sornschema::EveryTypePlain;
 
-class UnmarshalTest : public BinaryFixture {
- protected:
-    /// The fields that bytes are read as, written again; "refused".
-    std::string Again(unsigned structId, const std::string& hex) {
-        const ref<SornObject> object = Read(structId, hex);
-        return object == nullptr ? "refused" : FieldsOf(object);
-    }
-    std::string Companion(const std::string& hex) { return Again(EveryTypeCompanion::structIdG, hex); }
-    /// What one field of everyType takes the bytes as; "refused".
-    std::string OneField(const char* name, const std::string& hex) {
-        const OneFieldStruct one(name);
-        const ref<SornObject> object = EveryType::Factory(&pool);
-        const ExactBytes bytes(Bytes(hex));
-        const unsigned char* cursor = bytes.Begin();
-        if (!Codec().UnmarshalFields(&one.Info(), &cursor, bytes.End(), object.get())) return "refused";
-        EXPECT_EQ(cursor, bytes.End());
-        return Written(
-            [&](ProtoBufByteOutputStream& s) { Codec().MarshalFields(&one.Info(), object.get(), s); });
-    }
-};
-
-TEST_F(UnmarshalTest, UnknownFields) {
-    struct Case {
-        unsigned structId;
-        const char* hex;
-        const char* lines;
-        const char* again;  ///< a companion's number, or "refused"
-    };
-    const unsigned companion = EveryTypeCompanion::structIdG;  // eight slots, 0 to 7
-    const char* const eight = "field number '8' out of range in 'everyTypeCompanion'\n";
-    const Case cases[] = {
-        {companion, "40 05 38 06", eight, "38 06"},
-        {companion, "40 FF FF FF FF FF FF FF FF FF 01 38 06", eight, "38 06"},
-        {companion, "41 01 02 03 04 05 06 07 08 38 06", eight, "38 06"},
-        {companion, "42 03 38 06 07 38 08", eight, "38 08"},
-        {companion, "42 00", eight, ""},
-        {companion, "42 81 80 80 80 10 07 38 06", eight, "38 06"},  // of 2^32 + 1 the low bits count
-        {companion, "00 05 38 06", "field number '0' undefined in 'everyTypeCompanion'\n", "38 06"},
-        {companion, "F8 FF FF FF 0F 05", "field number '536870911' out of range in 'everyTypeCompanion'\n",
-         ""},
-        {companion, "40", eight, "refused"},
-        {companion, "41 01 02 03 04 05 06 07", eight, "refused"},
-        {companion, "42 03 38 06", eight, "refused"},
-        {companion, "42", eight, "refused"},
-        {companion, "43", eight, "refused"},
-        {companion, "44", eight, "refused"},
-        {companion, "45 01 02 03 04", eight, "refused"},
-        {companion, "46 00", eight, "refused"},
-        {companion, "47 00", eight, "refused"},
-        {companion, "40 80 80 80 80 80 80 80 80 80 80 01", eight, "refused"},
-        {EveryType::structIdG, "80 04", "field number '64' undefined in 'everyType'\n", "refused"},
-    };
-    for (const Case& each : cases) {
-        SCOPED_TRACE(each.hex);
-        testing::internal::CaptureStdout();
-        const std::string again = Again(each.structId, each.hex);
-        EXPECT_EQ(testing::internal::GetCapturedStdout(), each.lines);
-        EXPECT_EQ(again, each.again);
-    }
-    testing::internal::CaptureStdout();
-    EXPECT_NE(Read(EveryType::structIdG, "80 04 05 40 00 88 05 01"),
-              nullptr);  // 64 a hole, 8 known, 81 the last + 1
-    EXPECT_EQ(testing::internal::GetCapturedStdout(),
-              "field number '64' undefined in 'everyType'\nfield number '81' out of range in 'everyType'\n");
-}
-
-TEST_F(UnmarshalTest, SkipFieldValue) {
-    struct Case {
-        unsigned wireType;
-        const char* hex;
-        int nUsed;  ///< -1: refused
-    };
-    const Case cases[] = {
-        {0, "05", 1},
-        {0, "80 80 80 80 80 80 80 80 80 01 07", 10},
-        {0, "80", -1},
-        {0, "", -1},
-        {1, "01 02 03 04 05 06 07 08", 8},
-        {1, "01 02 03 04 05 06 07", -1},
-        {2, "00", 1},
-        {2, "02 61 62 63", 3},
-        {2, "02 61", -1},
-        {2, "80 80 80 80 10", 5},                  // 2^32: nothing is left of it
-        {2, "FF FF FF FF 0F 61", -1},              // 2^32 - 1
-        {2, "80 80 80 80 08 61", -1},              // 2^31
-        {2, "FF FF FF FF FF FF FF FF FF 01", -1},  // 2^64 - 1
-        {3, "00 00", -1},
-        {4, "00 00", -1},
-        {5, "00 00 00 00 00", -1},
-        {6, "00 00", -1},
-        {7, "00 00", -1},
-    };
-    for (const Case& each : cases) {
-        SCOPED_TRACE(std::to_string(each.wireType) + ": " + each.hex);
-        const ExactBytes bytes(Bytes(each.hex));
-        const unsigned char* cursor = bytes.Begin();
-        EXPECT_EQ(Codec().SkipFieldValue(each.wireType, &cursor, bytes.End()), each.nUsed >= 0);
-        if (each.nUsed >= 0) {
-            EXPECT_EQ(cursor - bytes.Begin(), each.nUsed);
-        }
-    }
-}
-
-/// The bits of the wire type in a known field's tag are not looked at: 7 and 6 are a number and a text.
-TEST_F(UnmarshalTest, WireTypeOfKnownFields) {
-    for (const char* tag : {"38", "39", "3A", "3B", "3C", "3D", "3E", "3F"}) {
-        EXPECT_EQ(Companion(std::string(tag) + " 06"), "38 06");
-    }
-    for (const char* tag : {"30", "31", "32", "33", "34", "35", "36", "37"}) {
-        EXPECT_EQ(Companion(std::string(tag) + " 01 78"), "32 01 78");
-    }
-}
+class UnmarshalTest : public UnmarshalFixture {};
 
 TEST_F(UnmarshalTest, ValuesThatAreRefused) {
     struct Case {

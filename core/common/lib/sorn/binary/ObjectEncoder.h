@@ -3,6 +3,7 @@
 #include <cstdint>
 
 #include "rox/RoxWorkStack.h"
+#include "sorn/binary/LazyLevels.h"
 #include "sorn/binary/ReverseBuffer.h"
 #include "sorn/binary/StructPlan.h"
 #include "sorn/convert/FieldAccess.h"
@@ -42,6 +43,12 @@ class ObjectEncoder {
     void LazyBody(const ref<LazyDict>& body);
 
  private:
+    /// What a place of the walk lies in.
+    struct Nesting {
+        uint16_t nLazyLevels = 0;  ///< lazy bodies
+        bool isInText = false;     ///< one of them is JSON text
+    };
+    static_assert(maxLazyLevelsG < UINT16_MAX);
     /// An object under way, or one field of it.
     struct Frame {
         const SornObject* pObject;
@@ -53,7 +60,7 @@ class ObjectEncoder {
         const PlannedField* pHeadTag;  ///< whose tag stands before the object; null for none
         size_t end;                    ///< bytes behind the object
         RoxCore* pHeld;                ///< what keeps the object alive, or null
-        uint32_t nLazyLevels;          ///< lazy bodies around
+        Nesting nesting;
         Form form;
     };
 
@@ -61,13 +68,14 @@ class ObjectEncoder {
     bool StepFields();
     bool StartField(Frame& frame, const PlannedField& field);
     bool OpenElement(Frame& frame);
-    bool OpenLazyBody(const ref<LazyDict>& body, const PlannedField* headTag, uint32_t nLazyLevels);
+    bool OpenLazyBody(const ref<LazyDict>& body, const PlannedField* headTag, Nesting nesting);
+    bool EnterLazyBody(const ref<LazyDict>& body, Nesting& nesting);
+    ref<SornObject> NewTooDeepObject() const;
     void Open(const SornObject& object, Form form, const PlannedField* headTag, RoxCore* held,
-              uint32_t nLazyLevels);
+              Nesting nesting);
     void PushField(const SornObject& object);
     void Close();
     void WriteElements(const PlannedField& field, const FieldSource& source);
-    unsigned char* WriteText(const RoxString& text, unsigned char* p);
     unsigned char* WriteBytes(const rox::ByteBuffer& bytes, unsigned char* p);
     unsigned char* WriteAnyDict(const Dict& dict, unsigned char* p);
 
@@ -76,6 +84,7 @@ class ObjectEncoder {
     ReverseBuffer& outM;
     StructPlans plansM;
     PlannedField fieldM;  // of a walk over one field
+    LazyTextBudget textBudgetM;
     RoxWorkStack<Frame, 8> stackM;
 };
 

@@ -25,6 +25,9 @@ class ProtoBufByteOutputStream;
 ///
 /// A tag is a field's slot times 8 plus the wire type of its data type. Schema versions play no part: fields
 /// go out and come in by their current records.
+///
+/// What the operations get by pointer or reference is not null, unless they say what null does there:
+/// RoxAssertFail. A range of no bytes may begin and end at null.
 class ProtoBuf {
  public:
     /// What is read is made in the pool, which must outlive it.
@@ -32,9 +35,10 @@ class ProtoBuf {
         : pMempoolM(pool), tableM{vStructDef, nStructDef} {}
 
     // Writing. Cannot fail: a body that does not convert goes out as an object of type "error", and so does
-    // one inside more than maxLazyLevelsG bodies; null references go out as nothing, neither tag nor value.
-    // An object of a struct that the table has not got ends in RoxAssertFail. The operations append to the
-    // stream, any nesting costs memory and no stack, and the same object always gives the same bytes.
+    // one inside more than maxLazyLevelsG bodies, or one that LazyTextBudget does not allow for; null
+    // references inside objects go out as nothing, neither tag nor value. An object of a struct that the
+    // table has not got ends in RoxAssertFail. The operations append to the stream, any nesting costs memory
+    // and no stack, and the same object always gives the same bytes.
 
     /// Fields of an object, by the struct that its structId names.
     void Marshal(const SornObject* object, ProtoBufByteOutputStream& stream) const;
@@ -99,9 +103,10 @@ class ProtoBuf {
                           ref<SornObject>* out) const;
     /// The whole of the bytes as the top-level form.
     bool UnmarshalKnownDict(const unsigned char* data, int length, ref<SornObject>* out) const;
-    /// The same of a byte buffer. Lazy fields of the object share its bytes instead of copying them, so that
-    /// a body in a body in a body costs no more than its bytes. The buffer's pool must outlive the object
-    /// then.
+    /// The same of a byte buffer, false for null. Lazy fields of the object share its bytes instead of
+    /// copying them, so that a body in a body in a body costs no more than its bytes; but they have copies
+    /// when the bytes lie in another pool than this codec's, whose end the object may outlive. Bytes on the
+    /// general heap are always shared.
     bool UnmarshalKnownDict(const ref<rox::ByteBuffer>& bytes, ref<SornObject>* out) const;
     bool UnmarshalKnownDictValue(const unsigned char** cursor, const unsigned char* end,
                                  ref<SornObject>* out) const;
@@ -127,10 +132,27 @@ class ProtoBuf {
     /// Steps over a value of a wire type: 0 a number, 1 eight bytes, 2 a length and as many bytes.
     bool SkipFieldValue(unsigned wireType, const unsigned char** cursor, const unsigned char* end) const;
 
+    // Messages of the older form: records of RPC structs as top-level forms. They are written as any record.
+
+    /// The message in the whole of the bytes, never null: an OrvoRpcRequest, OrvoRpcResponse, OrvoRpcCancel
+    /// or OrvoRpcHello, or a record of type "error" with the code badArgument and words. docs/errors.md has
+    /// them.
+    ///
+    /// Unlike any other record, a request or a response must not have fields that this reader does not know,
+    /// "headers" among them, and its body is decoded at once; one that does not decode becomes an "error"
+    /// record, and the message is good. Missing fields keep their defaults, except that the body must be
+    /// there.
+    ref<SornObject> UnmarshalWrapper(const unsigned char* data, int length) const;
+    /// The same of what stands behind the struct's tag, up to `end`.
+    ref<SornObject> UnmarshalRequestWrapper(const unsigned char** cursor, const unsigned char* end) const;
+    ref<SornObject> UnmarshalResponseWrapper(const unsigned char** cursor, const unsigned char* end) const;
+
     /// The object as a dictionary in its current fields, wrapped in a new Dict in the pool.
     ref<Dict> DictFromSornObject(const ref<SornObject>& object) const;
 
  private:
+    template <class Message>
+    ref<SornObject> UnmarshalMessage(const unsigned char** cursor, const unsigned char* end) const;
     template <class Encode>
     void Write(ProtoBufByteOutputStream& stream, Encode encode) const;
     template <class Decode>

@@ -1,5 +1,6 @@
 #include "rox/RoxAssert.h"
 #include "sorn/binary/AnyDictEncoder.h"
+#include "sorn/binary/CheckGiven.h"
 #include "sorn/binary/ObjectEncoder.h"
 #include "sorn/binary/ProtoBuf.h"
 #include "sorn/binary/ReverseBuffer.h"
@@ -22,6 +23,7 @@ void ProtoBuf::Marshal(const SornObject* object, ProtoBufByteOutputStream& strea
 }
 
 void ProtoBuf::MarshalDict(const SornObject* object, ProtoBufByteOutputStream& stream) const {
+    CheckGiven(object);
     Write(stream, [=, this](ReverseBuffer& out) {
         ObjectEncoder(pMempoolM, tableM, out).Object(*object, ObjectEncoder::FIELDS);
     });
@@ -29,12 +31,14 @@ void ProtoBuf::MarshalDict(const SornObject* object, ProtoBufByteOutputStream& s
 
 void ProtoBuf::MarshalFields(const StructInfo* info, const SornObject* object,
                              ProtoBufByteOutputStream& stream) const {
+    CheckGiven(info, object);
     Write(stream,
           [=, this](ReverseBuffer& out) { ObjectEncoder(pMempoolM, tableM, out).Fields(*info, *object); });
 }
 
 void ProtoBuf::MarshalSingleField(const FieldInfo* field, const SornObject* object,
                                   ProtoBufByteOutputStream& stream) const {
+    CheckGiven(field, object);
     Write(stream, [=, this](ReverseBuffer& out) {
         ObjectEncoder(pMempoolM, tableM, out).SingleField(*field, *object);
     });
@@ -42,12 +46,14 @@ void ProtoBuf::MarshalSingleField(const FieldInfo* field, const SornObject* obje
 
 void ProtoBuf::MarshalMultiField(int tag, const FieldInfo* field, const SornObject* object,
                                  ProtoBufByteOutputStream& stream) const {
+    CheckGiven(field, object);
     Write(stream, [=, this](ReverseBuffer& out) {
         ObjectEncoder(pMempoolM, tableM, out).MultiField(static_cast<uint32_t>(tag), *field, *object);
     });
 }
 
 void ProtoBuf::MarshalSubdict(const SornObject* object, ProtoBufByteOutputStream& stream) const {
+    CheckGiven(object);
     Write(stream, [=, this](ReverseBuffer& out) {
         ObjectEncoder(pMempoolM, tableM, out).Object(*object, ObjectEncoder::SUBDICT);
     });
@@ -58,12 +64,14 @@ void ProtoBuf::MarshalKnownDict(const SornObject* object, ProtoBufByteOutputStre
 }
 
 void ProtoBuf::MarshalKnownDictValue(const SornObject* object, ProtoBufByteOutputStream& stream) const {
+    CheckGiven(object);
     Write(stream, [=, this](ReverseBuffer& out) {
         ObjectEncoder(pMempoolM, tableM, out).Object(*object, ObjectEncoder::KNOWN_VALUE);
     });
 }
 
 void ProtoBuf::MarshalKnownDictField(const SornObject* object, ProtoBufByteOutputStream& stream) const {
+    CheckGiven(object);
     Write(stream, [=, this](ReverseBuffer& out) {
         ObjectEncoder(pMempoolM, tableM, out).Object(*object, ObjectEncoder::KNOWN_FIELD);
     });
@@ -76,11 +84,13 @@ void ProtoBuf::MarshalKnownDictAsLazyField(const LazyDict* body, ProtoBufByteOut
 }
 
 void ProtoBuf::MarshalAnyDict(const Dict* dict, ProtoBufByteOutputStream& stream) const {
+    CheckGiven(dict);
     Write(stream,
           [=, this](ReverseBuffer& out) { AnyDictEncoder(pMempoolM, out).Body(*dict->GetDictionary()); });
 }
 
 void ProtoBuf::MarshalAnyDictWithLength(const Dict* dict, ProtoBufByteOutputStream& stream) const {
+    CheckGiven(dict);
     Write(stream, [=, this](ReverseBuffer& out) {
         AnyDictEncoder(pMempoolM, out).Body(*dict->GetDictionary());
         unsigned char* const p = out.Room(out.Begin(), varint::maxBytes64G);
@@ -90,6 +100,7 @@ void ProtoBuf::MarshalAnyDictWithLength(const Dict* dict, ProtoBufByteOutputStre
 
 void ProtoBuf::MarshalAnyDictField(const Dict* dict, const RoxString& name,
                                    ProtoBufByteOutputStream& stream) const {
+    CheckGiven(dict);
     Write(stream, [&, this](ReverseBuffer& out) {
         AnyDictEncoder(pMempoolM, out).Entry(*dict->GetDictionary(), name);
     });
@@ -97,6 +108,7 @@ void ProtoBuf::MarshalAnyDictField(const Dict* dict, const RoxString& name,
 
 void ProtoBuf::MarshalAnyDictValue(const Dict* dict, const RoxString& name, unsigned index,
                                    ProtoBufByteOutputStream& stream) const {
+    CheckGiven(dict);
     Write(stream, [&, this](ReverseBuffer& out) {
         const ref<DictValue> value = dict->FindValue(name, index);
         AnyDictEncoder(pMempoolM, out).Value(value.get());
@@ -104,6 +116,7 @@ void ProtoBuf::MarshalAnyDictValue(const Dict* dict, const RoxString& name, unsi
 }
 
 ref<rox::ByteBuffer> ProtoBuf::MarshalKnownDict(const SornObject* object) const {
+    CheckGiven(object);
     ReverseBuffer out;
     ObjectEncoder(pMempoolM, tableM, out).Object(*object, ObjectEncoder::KNOWN_VALUE);
     const size_t nBytes = out.Count();

@@ -33,8 +33,10 @@ uint32_t CountPresenceWords(const StructInfo& info, uint32_t nSlots) {
     for (uint32_t slot = 0; slot < nSlots; ++slot) {
         const FieldInfo* const field = info.vFieldInfo + slot;
         const FieldInfo* const group = field - slot % StructPlan::nGroupG;
-        const auto isSame = [field](const FieldInfo& other) { return WordOf(other) == WordOf(*field); };
-        if (field->presenceOffset != 0 && std::none_of(group, field, isSame)) ++n;
+        const auto isSame = [field](const FieldInfo& other) {
+            return FHasPresenceByte(other) && WordOf(other) == WordOf(*field);
+        };
+        if (FHasPresenceByte(*field) && std::none_of(group, field, isSame)) ++n;
     }
     return n;
 }
@@ -88,19 +90,28 @@ void StructPlan::AddToGroup(const FieldInfo& field, uint32_t slot) {
     const bool isMulti = field.arity == SORN_ARITY_MULTI;
     const bool isRequired = field.arity == SORN_ARITY_REQUIRED;
     if (storage != FieldStorage::PLAIN) group.leadsAway |= uint64_t{1} << bit;
-    if (field.presenceOffset != 0) {
+    if (FHasPresenceByte(field)) {
         AddPresence(group, field.presenceOffset, bit);
     } else if (storage == FieldStorage::PLAIN && isMulti) {
         const size_t count = field.storageOffset + RoxGenericIntArray::CountOffset();
-        const size_t inWord = count % sizeof(size_t);
-        *group.pMembersEnd++ = {size_t{UINT16_MAX} << 8 * inWord, static_cast<uint16_t>(count - inWord), bit};
-    } else if (storage == FieldStorage::PLAIN || (storage == FieldStorage::TEXT && isRequired)) {
+        *group.pMembersEnd++ = TestOf(count, UINT16_MAX, bit);
+    } else if (isRequired && storage != FieldStorage::REFERENCE) {
         group.alwaysSet |= uint64_t{1} << bit;
+    } else if (storage == FieldStorage::PLAIN) {
+        const uint32_t mask = field.Type() == SORN_DATA_TYPE_BOOL ? UINT8_MAX : UINT32_MAX;
+        *group.pMembersEnd++ = TestOf(field.storageOffset, mask, bit);
     } else {
-        // References are written only when they are not null. Containers with values have storage, which
-        // their first word leads to.
+        // References are written only when they are not null, and so are optional texts here. Containers with
+        // values have storage, which their first word leads to.
         *group.pMembersEnd++ = {SIZE_MAX, field.storageOffset, bit};
     }
+}
+
+/// A test of the bytes at an offset that the mask covers, which all lie in one aligned word: so no word that
+/// is looked at leaves the object.
+StructPlan::MemberTest StructPlan::TestOf(size_t offset, uint32_t mask, uint16_t bit) {
+    const size_t inWord = offset % sizeof(size_t);
+    return {size_t{mask} << 8 * inWord, static_cast<uint16_t>(offset - inWord), bit};
 }
 
 void StructPlan::AddPresence(Group& group, uint32_t offset, uint32_t bit) {

@@ -10,6 +10,11 @@
 
 namespace sorn {
 
+/// Only of optional fields a presence byte is looked at, and only when metadata gives them one.
+inline bool FHasPresenceByte(const FieldInfo& field) {
+    return field.arity == SORN_ARITY_OPTIONAL && field.presenceOffset != 0;
+}
+
 /// A field as the codec wants it: what FieldInfo says, and its tag.
 struct PlannedField {
     /// What a field's values are: the data type of a single field, and that with multiG of a repeated one.
@@ -24,7 +29,7 @@ struct PlannedField {
     /// Without a tag.
     explicit PlannedField(const FieldInfo& field)
         : storageOffset(field.storageOffset),
-          presenceOffset(field.presenceOffset),
+          presenceOffset(FHasPresenceByte(field) ? field.presenceOffset : uint16_t{0}),
           typeRef(field.typeRef),
           kind(static_cast<uint8_t>(field.dataType + (field.arity == SORN_ARITY_MULTI ? multiG : 0))) {}
     PlannedField(const FieldInfo& field, uint32_t tag);
@@ -62,9 +67,10 @@ class StructPlan {
     /// Slots that are looked at together.
     static constexpr uint32_t nGroupG = 64;
     uint32_t NGroups() const { return nGroupsM; }
-    /// A bit for each slot of a group whose field has a value in the object; the bit may stand for a repeated
-    /// field without values, too. Without a branch for each field, since which fields are set cannot be
-    /// foretold.
+    /// A bit for each slot of a group whose field has a value in the object: an optional one by its presence
+    /// byte, or, without one, by the first 32 bits of its member, a reference by all of it; the bit may stand
+    /// for a repeated field without values, too. Without a branch for each field, since which fields are set
+    /// cannot be foretold.
     uint64_t FindSet(const void* object, uint32_t iGroup) const {
         const Group& group = Groups()[iGroup];
         uint64_t isSet = group.alwaysSet;
@@ -133,6 +139,7 @@ class StructPlan {
     static StructPlan* New(const StructInfo& info);
     static void Delete(StructPlan* plan);
     void AddToGroup(const FieldInfo& field, uint32_t slot);
+    static MemberTest TestOf(size_t offset, uint32_t mask, uint16_t bit);
     static void AddPresence(Group& group, uint32_t offset, uint32_t bit);
     // The groups lie right behind the plan, so that no pointer leads to them; then the rest.
     Group* Groups() { return reinterpret_cast<Group*>(this + 1); }

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <cstdint>
+
 #include "rox/ref.h"
 #include "sorn/model/OrvoVersion.h"
 
@@ -50,5 +52,8 @@ ref<LazyDict> NewLazyBodyOfSource(RoxMempool* pool, kelbaselib::Bytesource* sour
 ref<LazyDict> ShareLazyBody(const LazyDict* body);
 /// LazyDict::ToSornObjectOrError; the body is not null.
 ref<SornObject> ObjectOfLazyBody(const ref<LazyDict>& body);
+/// Bytes of JSON text that a conversion of the body reads, which is not null; 0 for a body of another form,
+/// and for a stream that does not know its length.
+uint32_t TextBytesOfLazyBody(const ref<LazyDict>& body);
 
 }  // namespace sorn

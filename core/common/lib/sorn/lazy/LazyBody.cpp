@@ -1,5 +1,6 @@
 #include "sorn/dict/LazyBody.h"
 
+#include "kelbaselib/Bytesource.h"
 #include "sorn/dict/Dict.h"
 #include "sorn/dict/Dictionary.h"
 #include "sorn/dict/RoxByteBuffer.h"
@@ -43,6 +44,16 @@ ref<LazyDict> ShareLazyBody(const LazyDict* body) {
 
 ref<SornObject> ObjectOfLazyBody(const ref<LazyDict>& body) {
     return body->ToSornObjectOrError();
+}
+
+uint32_t TextBytesOfLazyBody(const ref<LazyDict>& body) {
+    if (body->GetRep() == LazyDict::REP_JSON && body->GetStoredBytes() != nullptr) {
+        return body->GetStoredBytes()->GetLength();
+    }
+    if (body->GetRep() == LazyDict::REP_BYTESOURCE && body->GetStoredBytesource() != nullptr) {
+        return body->GetStoredBytesource()->GetAvailable();
+    }
+    return 0;
 }
 
 }  // namespace sorn
