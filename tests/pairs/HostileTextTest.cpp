@@ -1,3 +1,6 @@
+// Texts cut off at every byte, with wrong bits and with wrong tokens, through all readers of text, and what
+// they take through all writers. Invariants for untrusted input: 1, 2, 9, 13, 14.
+
 #include "kelbaselib/InMemoryBytestream.h"
 #include "pairs/HostileFixture.h"
 #include "pairs/LibraryForms.h"

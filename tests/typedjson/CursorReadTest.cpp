@@ -1,4 +1,4 @@
-// The cursor: blocks, tokens, single values, capture.
+// The cursor: blocks, tokens, single values, capture. Invariants for untrusted input: 1, 13.
 
 #include <cinttypes>
 #include <cstdio>

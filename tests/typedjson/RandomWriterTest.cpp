@@ -1,4 +1,5 @@
-// The typed writer's text of random objects is, read as a dictionary, what their dictionaries are.
+// The typed writer's text of random objects of all structs is, read as a dictionary, what their dictionaries
+// are. The pairs of forms say more of it, but not on targets where they are cut to the record of every type.
 
 #include "convert/RandomRecord.h"
 #include "sorn/model/Schema.h"

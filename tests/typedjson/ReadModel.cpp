@@ -299,7 +299,8 @@ struct Model {
         const bool isBracketed = Is('[');
         if (isBracketed) ++p;
         Skip();
-        if (Is(']')) {
+        const bool isList = slot < 0 || object.info->vFieldInfo[slot].arity == 2;
+        if (Is(']') && (isList || !isBracketed)) {
             if (isBracketed) ++p;
             return true;
         }

@@ -1,4 +1,5 @@
-// Streams: bytes read, sources released, values over the end of a block; lazy bodies; limits.
+// Streams: bytes read, sources released, values over the end of a block; lazy bodies; limits. Invariants for
+// untrusted input: 6, 11, 13.
 
 #include <utility>
 #include <vector>

@@ -17,7 +17,9 @@ namespace sorn {
 
 /// A cursor over JSON text, in memory or in a byte source, with the block around it. It can also copy what it
 /// passes. Holds its block inline, so that it is used on the stack of one call and one thread. It owns
-/// neither the bytes nor the source.
+/// neither the bytes nor the source. While it captures it holds the bytes that it has copied, and no
+/// destructor gives them back: whoever starts a capture ends it with FinishCapture or DropCapture, after a
+/// failure too.
 class InputPointerBytesource {
  public:
     static constexpr unsigned blockBytesG = 16384;
@@ -57,7 +59,7 @@ class InputPointerBytesource {
         return true;
     }
 
-    /// Begins to capture what is passed from here on; bytes are copied into the pool.
+    /// Begins to capture what is passed from here on; bytes are copied into the pool. Not while it captures.
     void StartCapture(RoxMempool* pool);
     /// Ends the capture and gives a source over the bytes, at its start, which the caller then owns.
     kelbaselib::Bytesource* FinishCapture();
@@ -81,7 +83,7 @@ class InputPointerBytesource {
     bool canRefillM;                     ///< false: nothing comes behind pEndM
     bool isCapturingM = false;
     const unsigned char* pCaptureStartM = nullptr;            ///< first byte that was not copied yet
-    kelbaselib::InMemoryBytestream* pCaptureSinkM = nullptr;  ///< made by the first copy
+    kelbaselib::InMemoryBytestream* pCaptureSinkM = nullptr;  ///< made by the first copy, the cursor's own
 
  private:
     bool SkipInNextBlocks();

@@ -71,6 +71,7 @@ bool ReadBytestring(RoxMempool* pool, InputPointerBytesource& cursor, ref<rox::B
     CursorText text(pool);
     if (!text.Read(cursor)) return false;
     out = textvalue::ToBytes(pool, text.View());
+    if (out == nullptr) out = rox::ByteBuffer::NewOfLength(pool, 0);
     return true;
 }
 

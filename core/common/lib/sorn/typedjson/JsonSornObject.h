@@ -32,9 +32,10 @@ class JsonSornObject {
     // form, else those that hold in it; sub-objects alike, but not what lies in lazy and any-dict fields),
     // and "type" stands in front of the last slot whose name sorts below it, whether or not that slot has a
     // value, or behind all fields when there is none. Older forms of fields are never written. Null
-    // references are left out, in lists too. Writing cannot fail: a number without a name in its enumeration
-    // is written as "INVALID_VALUE:" and the number, an id without a struct as "XXX", and ids are cut at 99
-    // bytes. The objects are only read, and nesting of any kind is bounded by memory alone.
+    // references are left out, in lists too, and so are lazy bodies that cannot be read. Writing cannot fail:
+    // a number without a name in its enumeration is written as "INVALID_VALUE:" and the number, an id without
+    // a struct as "XXX", and ids are cut at 99 bytes. The objects are only read, and nesting of any kind is
+    // bounded by memory alone.
 
     /// The whole text of an object, in the pool.
     RoxString SornObjectToJson(const SornObject* object, OrvoVersion version);
@@ -44,15 +45,15 @@ class JsonSornObject {
     /// unless `first`, which becomes false.
     void WriteFieldName(const char* name, ByteBuffer& out, bool& first);
     /// Appends one field of arity 0 or 1 under a name of the caller's: whether it is present, and whether it
-    /// holds in the version, is not asked. A null reference writes nothing, not even the name; of a data type
-    /// that does not exist only the name is written.
+    /// holds in the version, is not asked. A null reference and a lazy body that cannot be read write
+    /// nothing, not even the name; of a data type that does not exist only the name is written.
     void SingleFieldToJson(const char* name, const FieldInfo* field, const SornObject* object,
                            ByteBuffer& out, bool& first, OrvoVersion version);
     /// The same for a field of arity 2: without elements, and for a data type that does not exist, nothing.
-    /// Elements that are all null give an empty list.
+    /// Elements that are all left out give an empty list.
     void MultiFieldToJson(const char* name, const FieldInfo* field, const SornObject* object, ByteBuffer& out,
                           bool& first, OrvoVersion version);
-    /// Appends a body's compact text; null writes nothing.
+    /// Appends a body's compact text; null, and a body that cannot be read, write nothing.
     void LazyToJson(const LazyDict* body, ByteBuffer& out);
 
     // Reading (JsonSornObjectRead.cpp).
@@ -64,8 +65,10 @@ class JsonSornObject {
     //
     // On failure words grow in `err` from the inside out, behind what it holds already; some replace it. None
     // come from inside objects and dictionaries in fields, and none at all for a text without a "type" or
-    // with an unknown one. A single value in a repeated field is an element; arrays in arrays are flattened.
-    // A 65,536th element is refused, and so are objects that take more than ObjectBudget gives for the text.
+    // with an unknown one. Their number is bounded (ObjectReaderWords::maxBytesG). A single value in a
+    // repeated field is an element; arrays in arrays are flattened. An array for another field is refused,
+    // one without elements too. A 65,536th element is refused, and so are objects that take more than
+    // ObjectBudget gives for the text.
 
     /// From memory; a negative length counts as 0. On failure `*out` is null.
     bool JsonToSornObject(const unsigned char* data, int length, OrvoVersion version, ref<SornObject>* out,
@@ -79,11 +82,13 @@ class JsonSornObject {
     bool JsonToSornObject(InputPointerBytesource& first, InputPointerBytesource& second, OrvoVersion version,
                           ref<SornObject>* out, RoxString& err);
 
-    // The parts of a read. They go on with the numbering of objects that the last read left: an object that
-    // the list does not have yet is noted there and skipped, whatever struct is given. Without a field a
-    // value is dropped. The object's other fields and presence bytes are left alone; after a failure a
-    // repeated field keeps the elements in front of the bad one. `depth` limits nothing. A single value for a
-    // repeated field and an element for another one are refused.
+    // The parts of a read. They go on with the numbering of objects that the last read left: the object that
+    // comes when all in the list have come is noted there and skipped, whatever struct is given. An any-dict
+    // field counts as one object and is never noted: the numbers that have run past the list with it belong
+    // to no object of the list, and an object behind it is made of the struct that is given, a known dict of
+    // none. Without a field a value is dropped. The object's other fields and presence bytes are left alone;
+    // after a failure a repeated field keeps the elements in front of the bad one. `depth` limits nothing. A
+    // single value for a repeated field and an element or array for another one are refused.
 
     /// An object of a struct; null in `*out` (which may be missing) for one that is skipped.
     bool Unmarshal(int depth, InputPointerBytesource& cursor, const StructInfo* info, ref<SornObject>* out,

@@ -117,13 +117,20 @@ ObjectReader::Step ObjectReader::StartValue() {
 
 ObjectReader::Step ObjectReader::StartArray(bool isBracketed) {
     if (isBracketed) ++cursorM.pCurrentM;
-    if (cursorM.FSkipTo(']')) {
+    if (FNoElement(isBracketed)) {
         if (isBracketed) ++cursorM.pCurrentM;
         return Step::CLOSED;
     }
     levelsM.Push(isBracketed ? ObjectReaderLevel::FIRST_ELEMENT : ObjectReaderLevel::LONE_ELEMENT);
     ++stackM.Top().nLevels;
     return ReadElements(false);
+}
+
+/// Whether an array ends where its first element would stand. A field that is no list takes no array: there
+/// the bracket stands for an element, which ReadValue refuses.
+bool ObjectReader::FNoElement(bool isBracketed) {
+    const bool isTaken = !isBracketed || stackM.Top().pField->arity == SORN_ARITY_MULTI;
+    return cursorM.FSkipTo(']') && isTaken;
 }
 
 /// Reads elements until all arrays of the field under way end, or an object opens in one.
@@ -144,8 +151,11 @@ ObjectReader::Step ObjectReader::ReadElements(bool fBehindElement) {
         }
         if (cursorM.FSkipTo('[')) {
             ++cursorM.pCurrentM;
-            fBehindElement = cursorM.FTake(']');
-            if (fBehindElement) continue;
+            fBehindElement = FNoElement(true);
+            if (fBehindElement) {
+                ++cursorM.pCurrentM;
+                continue;
+            }
             levelsM.Push(ObjectReaderLevel::FIRST_ELEMENT);
             ++frame.nLevels;
             continue;

@@ -8,6 +8,7 @@
 #include "rox/ref.h"
 #include "sorn/convert/FieldAccess.h"
 #include "sorn/convert/ObjectBudget.h"
+#include "sorn/dict/RoxByteBuffer.h"
 #include "sorn/model/FieldInfo.h"
 #include "sorn/model/SornObject.h"
 #include "sorn/model/StructInfo.h"
@@ -23,7 +24,7 @@ namespace sorn {
 
 /// The walk over a text that makes objects and stores their fields, with stacks of its own; the second pass
 /// of a read. One reader makes one read. Objects take their structs from the list of the first pass; one
-/// that the list does not have yet is skipped, and so is one without a struct.
+/// that joins the list only now is skipped, and so is one without a struct.
 class ObjectReader {
  public:
     /// `error` is the caller's string, which gets the words of a failure. `nInput`: the bytes of the text, as
@@ -68,6 +69,7 @@ class ObjectReader {
     Step SkipMember(std::string_view key);
     Step StartValue();
     Step StartArray(bool isBracketed);
+    bool FNoElement(bool isBracketed);
     Step ReadElements(bool fBehindElement);
     Step ReadValue(bool isMulti);
     Step OpenValue(const StructInfo* info);
@@ -85,6 +87,7 @@ class ObjectReader {
     bool StoreEnum(const FieldInfo& field, const NameKey& name, const FieldTarget& target);
     bool StoreId(const FieldInfo& field, std::string_view text, const FieldTarget& target);
     bool StoreText(std::string_view text, const FieldTarget& target);
+    bool StoreBytes(std::string_view text, const FieldTarget& target);
     RoxString Cut(std::string_view text);
     bool Stored(bool isStored) { return isStored || FailFull(); }
     bool FailFull();
@@ -109,7 +112,8 @@ class ObjectReader {
     ObjectSkipper skipperM;
     RoxWorkStack<Frame, 16> stackM;
     ObjectReaderLevels levelsM;
-    ref<SornObject> outermostM;  ///< the outermost object that was made
+    ref<SornObject> outermostM;     ///< the outermost object that was made
+    ref<rox::ByteBuffer> noBytesM;  ///< the value of all byte strings without bytes; made for the first
 };
 
 }  // namespace sorn

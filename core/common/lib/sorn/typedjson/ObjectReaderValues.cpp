@@ -1,4 +1,6 @@
 // The table of data types on the way from text to members, but for objects.
+#include <utility>
+
 #include "kelbaselib/Bytesource.h"
 #include "sorn/dict/Dict.h"
 #include "sorn/dict/LazyBody.h"
@@ -77,7 +79,7 @@ bool ObjectReader::ReadText(const FieldInfo& field, std::string_view text, bool 
         case SORN_DATA_TYPE_FLOAT:
             return StoreNumber<double>(textvalue::ToFloat, text, target);
         case SORN_DATA_TYPE_BYTESTRING:
-            return Stored(target.StoreReference(textvalue::ToBytes(pMempoolM, text)));
+            return StoreBytes(text, target);
         case SORN_DATA_TYPE_CHANNEL:
             return StoreValid<ChannelNumber>(text, target);
         case SORN_DATA_TYPE_CURRENCY:
@@ -124,6 +126,14 @@ bool ObjectReader::StoreId(const FieldInfo& field, std::string_view text, const 
         default:
             return textvalue::ToStringId(field, text, bare) && StoreText(bare, target);
     }
+}
+
+/// All values without bytes are one buffer: an element of a list takes two bytes of text.
+bool ObjectReader::StoreBytes(std::string_view text, const FieldTarget& target) {
+    ref<rox::ByteBuffer> bytes = textvalue::ToBytes(pMempoolM, text);
+    if (bytes != nullptr) return Stored(target.StoreReference(std::move(bytes)));
+    if (noBytesM == nullptr) noBytesM = rox::ByteBuffer::NewOfLength(pMempoolM, 0);
+    return Stored(target.StoreReference(noBytesM));
 }
 
 RoxString ObjectReader::Cut(std::string_view text) {

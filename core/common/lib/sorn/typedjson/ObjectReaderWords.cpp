@@ -4,12 +4,17 @@
 
 namespace sorn {
 
-bool ObjectReaderWords::Append(const char* text) {
-    if (isSilentM) return false;
-    const size_t nByte = strlen(text);
-    if (nByte > maxBytesG - nByteM) return false;
+bool ObjectReaderWords::Append(const char* text, const char* more) {
+    if (isSilentM || isFullM) return false;
+    const size_t nByte = strlen(text) + strlen(more);
+    if (nByte > maxBytesG - nByteM) {
+        isFullM = true;
+        wordsM.Append(restWordsG);
+        return false;
+    }
     nByteM += nByte;
     wordsM.Append(text);
+    wordsM.Append(more);
     return false;
 }
 
@@ -39,8 +44,7 @@ bool ObjectReaderWords::AppendArrayWords(const ObjectReaderLevels& levels, size_
 }
 
 bool ObjectReaderWords::AppendKeyWords(const char* key) {
-    Append(" Failed to parse value for key ");
-    return Append(key);
+    return Append(" Failed to parse value for key ", key);
 }
 
 }  // namespace sorn

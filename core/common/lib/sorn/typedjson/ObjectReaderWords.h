@@ -21,7 +21,7 @@ class ObjectReaderWords {
         if (!isSilentM) wordsM.Replace(text);
         return false;
     }
-    bool Append(const char* text);
+    bool Append(const char* text, const char* more = "");
     /// What the readers of a value add when it is bad: for the arrays around it up to the member, and for a
     /// single one.
     bool AppendValueWords(const ObjectReaderLevels& levels, size_t nLevels);
@@ -30,13 +30,16 @@ class ObjectReaderWords {
     bool AppendKeyWords(const char* key);
     void Commit() { wordsM.Commit(); }
 
- private:
-    /// Beyond this many bytes the outer wrappers are left out: with each byte of input the words can grow by
-    /// 33.
-    static constexpr size_t maxBytesG = 1u << 30;
+    /// Bytes that may be appended. With each byte of input the words of a nest grow by 33, and nobody reads
+    /// that many: a piece that would go beyond it stays out, with all that come behind it, and restWordsG
+    /// stand there instead.
+    static constexpr size_t maxBytesG = 1u << 20;
+    static constexpr const char* restWordsG = " The rest of the words is left out.";
 
+ private:
     ErrorWords wordsM;
     size_t nByteM = 0;
+    bool isFullM = false;
     bool isSilentM = false;
 };
 

@@ -36,7 +36,7 @@ void ObjectWriter::BeginField(const char* name, const FieldInfo& field, bool isM
 
 bool ObjectWriter::WriteNamed(const char* name, const Step& step, const SornObject& object,
                               OrvoVersion version, bool& isFirst) {
-    if (!step.FHasValue(object)) return true;
+    if (!step.FHasValue(object) || !FPrepare(step, object)) return true;
     WriteName(name, std::strlen(name), isFirst, outM);
     return WriteMember(step, object, version);
 }
@@ -104,6 +104,7 @@ bool ObjectWriter::WriteOther(const Step& step, Frame& frame) {
         const Step named = WriterPlan::StepOf(field, field.arity == SORN_ARITY_MULTI);
         return WriteNamed(frame.pPlan->Info().FieldName(field), named, object, version, frame.isFirst);
     }
+    if (!FPrepare(step, object)) return true;
     outM.Written(step.PutKey(frame.isFirst, outM.Room(WriterPlan::maxKeyG + WriterPlan::nKeyBlockG)));
     frame.isFirst = false;
     return WriteMember(step, object, version);
@@ -135,14 +136,15 @@ void ObjectWriter::WriteName(const char* name, size_t nName, bool& isFirst, Json
 
 void ObjectWriter::ContinueList() {
     Frame& frame = framesM.Top();
+    const DataType type = frame.pField->Type();
     const FieldSource source(frame.pObject->MemberAt(*frame.pField), true);
     while (frame.next < frame.end) {
         const unsigned i = frame.next++;
         if (frame.next < frame.end) Prefetch(source.ReferenceAt<RoxCore>(i + 1));
-        if (source.ReferenceAt<RoxCore>(i) == nullptr) continue;
+        if (source.ReferenceAt<RoxCore>(i) == nullptr || !FPrepare(type, source, i)) continue;
         if (!frame.isFirst) outM.Byte(',');
         frame.isFirst = false;
-        if (!WriteReference(frame.pField->Type(), source, i, frame.version)) return;
+        if (!WriteReference(type, source, i, frame.version)) return;
     }
     outM.Byte(']');
     framesM.Pop();
@@ -194,15 +196,31 @@ bool ObjectWriter::WriteReference(DataType type, const FieldSource& source, unsi
             dictionaryM = source.ReferenceAt<Dict>(i)->GetDictionary();
             return false;
         case SORN_DATA_TYPE_KNOWN_DICT_AS_LAZY:
-            return WriteLazy(source.SharedAt<LazyDict>(i));
+            return WriteLazy();
         default:
             Open(*source.ReferenceAt<SornObject>(i), version, false);
             return false;
     }
 }
 
-bool ObjectWriter::WriteLazy(const ref<LazyDict>& body) {
-    LazyBodyContent content = LazyBodyToWrite(body, false, false);
+/// Fetches what a lazy body's text is made of. False when that is nothing: the body is left out then, with
+/// whatever would stand around it.
+bool ObjectWriter::FPrepare(DataType type, const FieldSource& source, unsigned i) {
+    if (type != SORN_DATA_TYPE_KNOWN_DICT_AS_LAZY) [[likely]]
+        return true;
+    bodyM = LazyBodyToWrite(source.SharedAt<LazyDict>(i), false, false);
+    return !bodyM.FNothing();
+}
+
+/// The same for a member that has a value; the elements of a list come later.
+bool ObjectWriter::FPrepare(const Step& step, const SornObject& object) {
+    return step.form != WriterPlan::SINGLE_REFERENCE ||
+           FPrepare(step.Type(), FieldSource(step.MemberOf(object), false), 0);
+}
+
+/// Writes the body that FPrepare has fetched.
+bool ObjectWriter::WriteLazy() {
+    LazyBodyContent content = std::exchange(bodyM, LazyBodyContent());
     if (content.dictionary != nullptr) {
         dictionaryM = std::move(content.dictionary);
         return false;
@@ -211,7 +229,7 @@ bool ObjectWriter::WriteLazy(const ref<LazyDict>& body) {
         BeginBody(content.object, content.version);
         return false;
     }
-    if (content.text != nullptr) outM.Bytes(content.text->GetData(), content.text->GetLength());
+    outM.Bytes(content.text->GetData(), content.text->GetLength());
     return true;
 }
 

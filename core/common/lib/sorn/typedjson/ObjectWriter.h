@@ -23,9 +23,9 @@ class Dictionary;
 
 /// The writer of objects straight from the tables to compact text. The fields stand in slot order, and "type"
 /// stands in front of the last slot whose name sorts below it, or behind all fields when there is none. Older
-/// forms of fields are never written. Null references are left out, a single field's with its name; a
-/// repeated field whose elements are all null is an empty list. It keeps its own stack, so that nesting is
-/// bounded by memory alone. The objects must not change meanwhile.
+/// forms of fields are never written. Null references are left out, a single field's with its name, and so
+/// are lazy bodies that cannot be read; a repeated field that is left without elements so is an empty list.
+/// It keeps its own stack, so that nesting is bounded by memory alone. The objects must not change meanwhile.
 ///
 /// Dictionaries, of any-dict fields and of lazy bodies, it cannot write: it stops before each one, and goes
 /// on behind it when whoever runs it has written the dictionary. What stands in the dictionary may be written
@@ -43,8 +43,8 @@ class ObjectWriter {
     /// Opens one field of an object: its name, which is written as it is, and its value or values, as an
     /// object would have them. `isMulti` stands in for the field's arity, and whether the field is present is
     /// not asked. A separator goes before it unless `isFirst`, which becomes false. A repeated field without
-    /// elements writes nothing; neither does one of a data type that does not exist, where a single one
-    /// writes its name.
+    /// elements writes nothing; neither does a lazy body that cannot be read, nor a repeated field of a data
+    /// type that does not exist, where a single one writes its name.
     void BeginField(const char* name, const FieldInfo& field, bool isMulti, const SornObject& object,
                     OrvoVersion version, bool& isFirst);
     /// Writes until no more than `depth` objects and lists are open. False when it stops before a dictionary.
@@ -98,7 +98,9 @@ class ObjectWriter {
     void WriteList(const Step& step, const SornObject& object);
     /// Of a reference that is not null.
     bool WriteReference(DataType type, const FieldSource& source, unsigned i, OrvoVersion version);
-    bool WriteLazy(const ref<LazyDict>& body);
+    bool FPrepare(DataType type, const FieldSource& source, unsigned i);
+    bool FPrepare(const Step& step, const SornObject& object);
+    bool WriteLazy();
 
     // Values that hold no others; a value is what FieldSource gives for it (ObjectWriterValues.cpp).
 
@@ -123,6 +125,7 @@ class ObjectWriter {
     WriterPlans plansM;
     JsonOutput& outM;
     RoxWorkStack<Frame, 16> framesM;
+    LazyBodyContent bodyM;  // of the lazy body that is written next
     ref<Dictionary> dictionaryM;
 };
 

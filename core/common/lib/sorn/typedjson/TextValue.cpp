@@ -140,9 +140,9 @@ bool ToStringId(const FieldInfo& field, std::string_view text, std::string_view&
 }
 
 ref<rox::ByteBuffer> ToBytes(RoxMempool* pool, std::string_view text) {
-    ref<rox::ByteBuffer> bytes = base64G.Decode(pool, reinterpret_cast<const unsigned char*>(text.data()),
-                                                static_cast<unsigned>(text.size()));
-    return bytes != nullptr ? bytes : rox::ByteBuffer::NewOfLength(pool, 0);
+    if (text.empty()) return nullptr;
+    return base64G.Decode(pool, reinterpret_cast<const unsigned char*>(text.data()),
+                          static_cast<unsigned>(text.size()));
 }
 
 }  // namespace sorn::textvalue

@@ -32,7 +32,7 @@ bool ToEnum(const FieldInfo& field, const NameKey& text, uint32_t& out);
 bool ToIntId(const FieldInfo& field, std::string_view text, unsigned& out);
 bool ToLongId(const FieldInfo& field, std::string_view text, unsigned long long& out);
 bool ToStringId(const FieldInfo& field, std::string_view text, std::string_view& out);
-/// The bytes of a Base64 text, in the pool: never null, empty for a bad text.
+/// The bytes of a Base64 text, in the pool; null when there are none, for a bad text too.
 ref<rox::ByteBuffer> ToBytes(RoxMempool* pool, std::string_view text);
 
 /// A text with a NUL behind it, in place while it is short.
