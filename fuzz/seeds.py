@@ -16,9 +16,12 @@ SEEDS = ROOT / "fuzz/seeds"
 SOURCES = {
     "any_dict": ("any_dict",),
     "base64": ("base64",),
+    "binary_message": ("binary_message",),
     "binary_record": ("binary_record",),
     "hand_parser": ("json", "examples"),
     "lazy_body": ("json", "binary_record", "examples"),
+    "message": ("message",),
+    "packetizer": ("message",),
     "readers_agree": ("json", "examples"),
     "stream_parser": ("json", "stream_parser", "examples"),
     "typed_reader_memory": ("json", "examples"),
@@ -27,7 +30,7 @@ SOURCES = {
 
 # Sizes 1 to 32, by the low five bits; the last reads nearly all at once.
 HEADS = (b"@ABC", b"AAAA", b"_@GO", b"\xff\xff\xff\xff")
-WITH_HEAD = ("lazy_body", "stream_parser", "typed_reader_stream")
+WITH_HEAD = ("lazy_body", "packetizer", "stream_parser", "typed_reader_stream")
 
 
 def example_seeds():

@@ -78,13 +78,6 @@ bool FSameFile(const std::string& path, std::FILE* file) {
            a.st_dev == b.st_dev && a.st_ino == b.st_ino;
 }
 
-std::FILE* Open(const std::string& path, const char* mode, std::FILE* standard) {
-    if (path.empty()) return standard;
-    std::FILE* file = std::fopen(path.c_str(), mode);
-    if (file == nullptr) std::perror(path.c_str());
-    return file;
-}
-
 /// The standard output for records alone: the library tells unknown fields of the binary form on the standard
 /// output, which becomes the standard error for that, line by line. Null and words on failure.
 std::FILE* TakeStandardOutput() {
@@ -105,7 +98,7 @@ int ConvertInto(const ConvertOptions& options, std::FILE* in) {
     }
     std::FILE* const standard = TakeStandardOutput();
     if (standard == nullptr) return SOME_REFUSED;
-    std::FILE* const out = Open(options.outPath, "wbe", standard);
+    std::FILE* const out = OpenFile(options.outPath, "wbe", standard);
     if (out == nullptr) return WRONG_USAGE;
     int code = ConvertStream(options, in, out);
     if (std::fclose(out) != 0) {
@@ -131,7 +124,7 @@ bool FCheck(const ConvertOptions& options) {
 
 int Convert(const ConvertOptions& options) {
     if (!FCheck(options)) return WRONG_USAGE;
-    std::FILE* in = Open(options.inPath, "rbe", stdin);
+    std::FILE* in = OpenFile(options.inPath, "rbe", stdin);
     if (in == nullptr) return WRONG_USAGE;
     const int code = ConvertInto(options, in);
     if (in != stdin) std::fclose(in);

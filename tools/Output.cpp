@@ -18,6 +18,13 @@ unsigned FileSink::Write(const void* bytes, unsigned count) {
     return std::ferror(pFileM) == 0 ? count : 0;
 }
 
+std::FILE* OpenFile(const std::string& path, const char* mode, std::FILE* standard) {
+    if (path.empty()) return standard;
+    std::FILE* const file = std::fopen(path.c_str(), mode);
+    if (file == nullptr) std::perror(path.c_str());
+    return file;
+}
+
 bool FinishOutput(std::FILE* file) {
     if (std::fflush(file) == 0 && std::ferror(file) == 0) return true;
     std::fputs("the output could not be written\n", stderr);

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdio>
+#include <string>
 
 #include "kelbaselib/Bytesink.h"
 
@@ -17,6 +18,10 @@ class FileSink final : public kelbaselib::Bytesink {
     std::FILE* pFileM;
     bool asOneLineM;
 };
+
+/// Opens the file in a mode of fopen; the standard one when the path is empty. Null, and words on standard
+/// error, when that fails.
+std::FILE* OpenFile(const std::string& path, const char* mode, std::FILE* standard);
 
 /// Flushes. False, and words on standard error, when anything since the file was opened could not be written.
 bool FinishOutput(std::FILE* file);

@@ -5,6 +5,8 @@
 #include "tools/Convert.h"
 #include "tools/Describe.h"
 #include "tools/ExitCode.h"
+#include "tools/Frame.h"
+#include "tools/Unframe.h"
 
 namespace {
 
@@ -47,6 +49,49 @@ void AddConvert(CLI::App& app, sorn::tools::ConvertOptions& options) {
     command->add_option("IN", options.inPath, "Input file (default: standard input)")->option_text("IN");
 }
 
+/// Adds "sorn frame".
+void AddFrame(CLI::App& app, sorn::tools::FrameOptions& options) {
+    CLI::App* command =
+        app.add_subcommand("frame", "Makes an ORPC/2 message of a body, or of lines that unframe wrote");
+    command->add_option("KIND", options.kind, "Kind of message")
+        ->check(CLI::IsMember({"request", "requestUpdate", "response", "cancel"}))
+        ->option_text("request|requestUpdate|response|cancel");
+    command->add_option("BODY", options.inPath, "File with the body's JSON (default: standard input)")
+        ->option_text("BODY.json");
+    command
+        ->add_option_function<uint32_t>(
+            "--rpc-id",
+            [&options](const uint32_t& number) {
+                options.rpcId = number;
+                options.hasRpcId = true;
+            },
+            "Number of the exchange")
+        ->option_text("N");
+    command->add_option("--request-type", options.requestType,
+                        "Type of the body of a request or update (default: what the body says)");
+    command->add_option("--count", options.count, "Responses that a request expects (default: single)")
+        ->check(CLI::IsMember({"none", "single", "multiple"}));
+    command
+        ->add_option(
+            "--schema-version", options.schemaVersion,
+            "Schema version of the body, which a request states (default there: the schema's default)")
+        ->check(CLI::NonNegativeNumber);
+    command->add_flag("--final", options.isFinal, "The last response of its exchange");
+    command->add_option("--header", options.vHeaders, "One more header; may be given several times")
+        ->option_text("NAME=VALUE")
+        ->allow_extra_args(false);
+    command->add_flag("--lines", options.lines, "The input has messages as unframe writes them, one a line");
+}
+
+/// Adds "sorn unframe".
+void AddUnframe(CLI::App& app, sorn::tools::UnframeOptions& options) {
+    CLI::App* command =
+        app.add_subcommand("unframe", "Takes a stream of ORPC/2 messages apart: one JSON object a message");
+    command->add_flag("--parse-body", options.parseBody,
+                      "Read the bodies: refuse bad ones and write the others anew, sorted");
+    command->add_option("IN", options.inPath, "Input file (default: standard input)")->option_text("IN");
+}
+
 int Run(int argc, char** argv) {
     CLI::App app{"The records of a digital video recorder platform: looks at their schema and converts them",
                  "sorn"};
@@ -55,13 +100,20 @@ int Run(int argc, char** argv) {
     sorn::tools::DescribeOptions describe;
     sorn::tools::ConvertOptions convert;
     AddDescribe(app, describe);
+    sorn::tools::FrameOptions frame;
+    sorn::tools::UnframeOptions unframe;
     AddConvert(app, convert);
+    AddFrame(app, frame);
+    AddUnframe(app, unframe);
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
         return app.exit(error) == 0 ? sorn::tools::DONE : sorn::tools::WRONG_USAGE;
     }
-    return app.got_subcommand("describe") ? sorn::tools::Describe(describe) : sorn::tools::Convert(convert);
+    if (app.got_subcommand("describe")) return sorn::tools::Describe(describe);
+    if (app.got_subcommand("frame")) return sorn::tools::Frame(frame);
+    if (app.got_subcommand("unframe")) return sorn::tools::Unframe(unframe);
+    return sorn::tools::Convert(convert);
 }
 
 }  // namespace

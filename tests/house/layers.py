@@ -17,8 +17,8 @@ class Layer(NamedTuple):
 
 
 PLATFORM = ("rox", "kelbaselib")
-LIBRARY = PLATFORM + ("model", "sornschema", "dict", "json", "convert", "binary", "typedjson", "lazy")
-TESTS_OF_LIBRARY = ("model", "schema", "dict", "json", "convert", "binary", "typedjson", "lazy", "pairs", "peer")
+LIBRARY = PLATFORM + ("model", "sornschema", "dict", "json", "convert", "binary", "typedjson", "lazy", "rpc")
+TESTS_OF_LIBRARY = ("model", "schema", "dict", "json", "convert", "binary", "typedjson", "lazy", "rpc", "pairs", "peer")
 
 # A layer stands behind all layers that it may include.
 LAYERS = {
@@ -34,6 +34,9 @@ LAYERS = {
     "typedjson": Layer(f"{SORN}/typedjson", "sorn/typedjson", PLATFORM + ("model", "dict", "json", "convert")),
     "lazy": Layer(
         f"{SORN}/lazy", "sorn/lazy", PLATFORM + ("model", "sornschema", "dict", "json", "convert", "binary", "typedjson")
+    ),
+    "rpc": Layer(
+        f"{SORN}/rpc", "sorn/rpc", PLATFORM + ("model", "sornschema", "dict", "json", "convert", "binary", "lazy")
     ),
     "sorn": Layer(SORN, "sorn", LIBRARY),  # sorn.h, the header of all
     "tools": Layer("tools", "tools", LIBRARY + ("sorn",)),

@@ -1,5 +1,4 @@
-"""The sorn command from outside: what it prints, where, and what it exits with. The command to run (with an emulator in
-front of it on a cross build) comes in SORN_TOOL."""
+"""The sorn command from outside: what it prints, where, and what it exits with."""
 
 import base64
 import json
@@ -13,20 +12,12 @@ import time
 import unittest
 from pathlib import Path
 
-TOOL = shlex.split(os.environ["SORN_TOOL"])
-ROOT = Path(__file__).resolve().parents[2]
-DONE, SOME_REFUSED, WRONG_USAGE = 0, 1, 2
-
-
-def run(*arguments, text=b""):
-    """Runs the tool on the text; gives its exit code, standard output and standard error."""
-    done = subprocess.run([*TOOL, *arguments], input=text, capture_output=True, timeout=300)
-    return done.returncode, done.stdout, done.stderr
+from tools.command import DONE, ROOT, SOME_REFUSED, TOOL, WRONG_USAGE, run
 
 
 class Usage(unittest.TestCase):
     def test_help_on_every_level(self):
-        for arguments in (["--help"], ["describe", "--help"], ["convert", "--help"]):
+        for arguments in (["--help"], *([each, "--help"] for each in ("describe", "convert", "frame", "unframe"))):
             code, out, err = run(*arguments)
             self.assertEqual((code, err), (DONE, b""), arguments)
             self.assertIn(b"Usage: sorn", out)
@@ -43,7 +34,7 @@ class Usage(unittest.TestCase):
     def test_help_of_all(self):
         code, out, _ = run("--help-all")
         self.assertEqual(code, DONE)
-        for word in (b"describe", b"convert", b"--json", b"--lines"):
+        for word in (b"describe", b"convert", b"--json", b"--lines", b"unframe", b"--rpc-id"):
             self.assertIn(word, out)
 
     def completions(self, *words):
@@ -60,7 +51,7 @@ class Usage(unittest.TestCase):
             return set(done.stdout.split())
 
     def test_completion(self):
-        for command in ("describe", "convert"):
+        for command in ("describe", "convert", "frame", "unframe"):
             helped = run(command, "--help")[1].decode().replace(",", " ").split()
             options = {word for word in helped if word.startswith("--")}
             self.assertEqual(self.completions(command, "--"), options, command)
@@ -68,6 +59,8 @@ class Usage(unittest.TestCase):
         self.assertEqual(self.completions("describe", "recordingS"), {"recordingSearch", "recordingSettings"})
         self.assertEqual(self.completions("convert", "--road", ""), {"dictionary", "typed"})
         self.assertEqual(self.completions("convert", "--to", ""), {"json", "binary"})
+        self.assertEqual(self.completions("frame", "--count", ""), {"none", "single", "multiple"})
+        self.assertEqual(self.completions("frame", "request"), {"request", "requestUpdate"})
 
 
 class Describe(unittest.TestCase):

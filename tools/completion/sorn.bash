@@ -2,11 +2,12 @@
 _sorn() {
     local word=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]} command=${COMP_WORDS[1]:-}
     if [ "$COMP_CWORD" -eq 1 ]; then
-        mapfile -t COMPREPLY < <(compgen -W 'describe convert --help --help-all' -- "$word")
+        mapfile -t COMPREPLY < <(compgen -W 'describe convert frame unframe --help --help-all' -- "$word")
         return
     fi
     case $previous in
         --from | --to) mapfile -t COMPREPLY < <(compgen -W 'json binary' -- "$word"); return ;;
+        --count) mapfile -t COMPREPLY < <(compgen -W 'none single multiple' -- "$word"); return ;;
         --road) mapfile -t COMPREPLY < <(compgen -W 'typed dictionary' -- "$word"); return ;;
     esac
     case $command:$word in
@@ -15,7 +16,12 @@ _sorn() {
         convert:-*)
             mapfile -t COMPREPLY < <(compgen -W '--from --to --road --schema-version --pretty --lines --output --help --help-all' -- "$word")
             ;;
-        convert:*) mapfile -t COMPREPLY < <(compgen -f -- "$word") ;;
+        frame:-*)
+            mapfile -t COMPREPLY < <(compgen -W '--rpc-id --request-type --count --schema-version --final --header --lines --help --help-all' -- "$word")
+            ;;
+        frame:*) mapfile -t COMPREPLY < <(compgen -W 'request requestUpdate response cancel' -f -- "$word") ;;
+        unframe:-*) mapfile -t COMPREPLY < <(compgen -W '--parse-body --help --help-all' -- "$word") ;;
+        convert:* | unframe:*) mapfile -t COMPREPLY < <(compgen -f -- "$word") ;;
     esac
 }
 complete -F _sorn sorn

@@ -31,6 +31,23 @@ void SizedObjectArray<1, RoxMempool>::Borrow(unsigned char* data, uint32_t n) {
     lengthM = n;
 }
 
+namespace {
+
+/// Bytes of a text, which it holds.
+class TextByteBuffer final : public ByteBuffer {
+ public:
+    TextByteBuffer(RoxMempool* pool, const RoxString& text, uint32_t offset, uint32_t n)
+        : ByteBuffer(pool), textM(text) {
+        // Nobody writes to storage that is borrowed.
+        bytesM.Borrow(reinterpret_cast<unsigned char*>(textM.GetRepN()->MutableBytes()) + offset, n);
+    }
+
+ private:
+    RoxString textM;
+};
+
+}  // namespace
+
 const char ByteBuffer::classTagG = 0;
 
 ByteBuffer::~ByteBuffer() = default;
@@ -69,6 +86,12 @@ ref<ByteBuffer> ByteBuffer::NewSlice(RoxMempool* pool, const ref<ByteBuffer>& ow
     result->bytesM.Borrow(owner->bytesM.GetData() + offset, n);
     result->ownerM = owner->ownerM != nullptr ? owner->ownerM : owner;
     return result;
+}
+
+ref<ByteBuffer> ByteBuffer::NewOfText(RoxMempool* pool, const RoxString& text, uint32_t offset, uint32_t n) {
+    RoxAssert(offset <= text.NByte() && n <= text.NByte() - offset, "ByteBuffer: range outside its text");
+    if (n == 0) return New(pool, nullptr, 0);
+    return ref<ByteBuffer>(new (pool) TextByteBuffer(pool, text, offset, n));
 }
 
 void* ByteBuffer::VkCastHelper(const void* classTag) {

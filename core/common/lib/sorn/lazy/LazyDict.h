@@ -121,6 +121,7 @@ class LazyDict final : public RoxCore {
 
     Rep GetRep() const { return repM; }
     OrvoVersion GetVersion() const { return versionM; }
+    void SetVersion(OrvoVersion version) { versionM = version; }
     const ref<Dict>& GetStoredDict() const { return dictM; }
     const ref<Dictionary>& GetStoredDictionary() const { return dictionaryM; }
     const ref<rox::ByteBuffer>& GetStoredBytes() const { return bytesM; }
