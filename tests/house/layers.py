@@ -44,7 +44,7 @@ LAYERS = {
     "bench/common": Layer("bench/common", "common", ()),
     **{
         f"bench/{name}": Layer(f"bench/{name}", name, LIBRARY + ("sorn", "bench/common"))
-        for name in ("text", "codecs", "instructions")
+        for name in ("text", "codecs", "messages", "instructions")
     },
     "fuzz/support": Layer("fuzz/support", "fuzz/support", LIBRARY + ("sorn",)),
     "fuzz": Layer("fuzz", "fuzz", LIBRARY + ("sorn", "fuzz/support")),
