@@ -26,6 +26,7 @@ TEST(FeaturesTest, OffAtTheStart) {
 }
 
 TEST(FeaturesTest, NamesHaveTheirNumbers) {
+    EXPECT_EQ(207u, unsigned{VK_FEATURE_LAST_SCHEMA_VERSION});
     EXPECT_EQ(548u, unsigned{VK_FEATURE_TYPED_JSON});
 }
 

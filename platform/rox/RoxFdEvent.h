@@ -1,0 +1,4 @@
+#pragma once
+
+/// Names what a descriptor's listener listens to: RoxListenerInterface<RoxFdEvent>.
+struct RoxFdEvent {};
