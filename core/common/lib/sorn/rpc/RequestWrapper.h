@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <string_view>
 
 #include "sorn/dict/Dict.h"
@@ -13,8 +14,8 @@ namespace sorn {
 /// A request. RequestUpdateWrapper derives from it, so that a test for a request succeeds on an update, too.
 class RequestWrapper : public OrvoRpcWrapper {
  public:
-    /// How many responses the sender expects.
-    enum ResponseCount {
+    /// How many responses the sender expects. Other numbers are held, too: their word is empty.
+    enum ResponseCount : uint32_t {
         RESPONSE_COUNT_NONE = 0,      ///< none: send and forget
         RESPONSE_COUNT_SINGLE = 1,    ///< exactly one
         RESPONSE_COUNT_MULTIPLE = 2,  ///< a stream, ended by a final one
