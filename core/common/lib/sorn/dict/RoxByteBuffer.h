@@ -77,8 +77,8 @@ class ByteBuffer : public RoxCore {
     static ref<ByteBuffer> NewSlice(RoxMempool* pool, const ref<ByteBuffer>& owner, uint32_t offset,
                                     uint32_t n);
 
-    /// A new one in the pool of n bytes of a text from `offset` on, without a copy: it holds the text, whose pool
-    /// must outlive it, and has no capacity. The range must lie in the text.
+    /// A new one in the pool of n bytes of a text from `offset` on, without a copy: it holds the text, whose
+    /// pool must outlive it, and has no capacity. The range must lie in the text.
     static ref<ByteBuffer> NewOfText(RoxMempool* pool, const RoxString& text, uint32_t offset, uint32_t n);
 
     const unsigned char* GetData() const { return bytesM.GetData(); }  ///< null without storage

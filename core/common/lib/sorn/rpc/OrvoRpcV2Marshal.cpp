@@ -96,7 +96,7 @@ class Framing {
 
  private:
     void AppendReserved();
-    void AppendDictionary();
+    bool AppendDictionary();
 
     OrvoRpcWrapper& wrapperM;
     RoxString& errorM;
@@ -114,8 +114,11 @@ void Framing::AppendReserved() {
     }
 }
 
-void Framing::AppendDictionary() {
+/// False for more names than an array of them holds: the message would go without some of its headers.
+bool Framing::AppendDictionary() {
+    if (knownM.isKnown && knownM.optionalHeaders->CountNames() > RoxStringArray::maxCount) return false;
     const ref<Dict> headers = wrapperM.HeadersToDict(poolM);
+    if (headers->CountNames() > RoxStringArray::maxCount) return false;
     RoxStringArray names(poolM);
     headers->GetSortedNames(names);
     for (unsigned i = 0; i < names.GetCount(); ++i) {
@@ -124,15 +127,21 @@ void Framing::AppendDictionary() {
             AppendLine(headersM, names[i].View(), headers->GetString(names[i], index).View());
         }
     }
+    return true;
 }
 
 bool Framing::MakeHeaders() {
     const bool hasReservedOnly =
         knownM.isKnown && (knownM.optionalHeaders == nullptr || knownM.optionalHeaders->CountNames() == 0);
-    hasReservedOnly ? AppendReserved() : AppendDictionary();
+    bool isComplete = true;
+    if (hasReservedOnly) {
+        AppendReserved();
+    } else {
+        isComplete = AppendDictionary();
+    }
     headersM.AppendLiteral("\r\n");
-    if (headersM.GetLength() > OrvoRpcV2::maxHeaderLengthG) return Fail("Orvo Rpc headers are too large");
-    return true;
+    return (isComplete && headersM.GetLength() <= OrvoRpcV2::maxHeaderLengthG) ||
+           Fail("Orvo Rpc headers are too large");
 }
 
 /// Makes the message and hands its three pieces to `put(pieces)`.
