@@ -6,8 +6,8 @@
 #include <vector>
 
 #include "DeathTestStyle.h"
-#include "Watchdog.h"
 #include "rox/RoxMutexHold.h"
+#include "support/Watchdog.h"
 
 namespace {
 

@@ -10,11 +10,11 @@
 #include <vector>
 
 #include "DeathTestStyle.h"
-#include "Watchdog.h"
 #include "rox/RoxCoreSemaphore.h"
 #include "rox/RoxInternalSemaphore.h"
 #include "rox/RoxMempool.h"
 #include "rox/ref.h"
+#include "support/Watchdog.h"
 
 namespace {
 

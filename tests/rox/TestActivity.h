@@ -9,11 +9,11 @@
 #include <string>
 
 #include "DeathTestStyle.h"
-#include "Watchdog.h"
 #include "rox/RoxActivity.h"
 #include "rox/RoxFd.h"
 #include "rox/RoxListenerInterface.h"
 #include "rox/RoxMempool.h"
+#include "support/Watchdog.h"
 
 /// Words of several threads in the order in which they came.
 class Trace {

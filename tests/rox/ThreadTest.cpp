@@ -12,8 +12,8 @@
 #include <string>
 #include <thread>
 
-#include "Watchdog.h"
 #include "rox/RoxInternalSemaphore.h"
+#include "support/Watchdog.h"
 
 namespace {
 
