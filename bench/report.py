@@ -16,10 +16,11 @@ from typing import NamedTuple
 import chart
 
 OURS = "sorn"
-DATA = ["examples", "5 KiB", "500 KiB", "5 MiB", "64 KiB body", "cancel", "request", "response"]
+DATA = ["examples", "5 KiB", "500 KiB", "5 MiB", "64 KiB body", "cancel", "request", "response",
+        "1 KiB", "1,000 streams"]
 MEMORY = "memory"
 WORKS = ["object to binary", "binary to object", "object to text", "text to object", "tree to text", "text to tree",
-         "frame and unframe", "write message", "read message", MEMORY]
+         "frame and unframe", "write message", "read message", "round trip", "response in a stream", MEMORY]
 # The ratio that is wanted, by work and peer; of memory, the highest.
 GOALS = {
     ("object to binary", "libprotobuf"): 1.5,
@@ -39,8 +40,13 @@ GOALS = {
     ("frame and unframe", "two copies"): 0.5,
     ("write message", "nlohmann-json"): 5,
     ("read message", "nlohmann-json"): 5,
+    ("round trip", "gRPC"): 5,
+    ("round trip", "bare socket"): 0.4,
+    ("response in a stream", "one stream"): 0.5,
     (MEMORY, "libprotobuf"): 1.0,
 }
+# Where the data make a difference.
+GOALS_OF_DATA = {("round trip", "5 MiB", "bare socket"): 0.5}
 
 
 class Row(NamedTuple):
@@ -50,6 +56,7 @@ class Row(NamedTuple):
     figure: float  # bytes per second; of memory, bytes
     ratio: float   # ours to this; None for ours
     goal: float    # or None
+    times: tuple   # medians of the 50th and the 99th percentile of single calls in microseconds, or None
 
     @property
     def is_met(self):
@@ -57,7 +64,7 @@ class Row(NamedTuple):
 
 
 def read_figures(paths):
-    """{(work, data): {library: [figure, ...]}}, in the order of the files."""
+    """{(work, data): {library: [(figure, p50, p99), ...]}}, in the order of the files; the percentiles may be None."""
     figures = {}
     for path in paths:
         with open(path, encoding="utf-8") as file:
@@ -69,29 +76,32 @@ def read_figures(paths):
                 continue
             work, data, library = run["name"].split("/")[:3]
             figure = run["bytes"] if work == MEMORY else run["bytes_per_second"]
-            figures.setdefault((work, data), {}).setdefault(library, []).append(figure)
+            figures.setdefault((work, data), {}).setdefault(library, []).append((figure, run.get("p50"), run.get("p99")))
     return figures
 
 
 def rows_of(figures):
     rows = []
     for (work, data), libraries in sorted(figures.items(), key=lambda item: (WORKS.index(item[0][0]), DATA.index(item[0][1]))):
-        medians = {library: statistics.median(values) for library, values in libraries.items()}
+        medians = {library: statistics.median(figure for figure, _, _ in runs) for library, runs in libraries.items()}
         for library, figure in sorted(medians.items(), key=lambda item: (item[0] != OURS, item[0])):
             ratio = None if library == OURS or OURS not in medians else medians[OURS] / figure
-            rows.append(Row(work, data, library, figure, ratio, GOALS.get((work, library))))
+            goal = GOALS_OF_DATA.get((work, data, library), GOALS.get((work, library)))
+            _, *times = zip(*libraries[library])
+            rows.append(Row(work, data, library, figure, ratio, goal, None if None in times[0] else tuple(map(statistics.median, times))))
     return rows
 
 
 def print_rows(rows):
-    print(f"{'work':<18}{'data':<12}{'library':<21}{'MB/s':>11}{'ours : it':>11}{'goal':>7}")
+    print(f"{'work':<22}{'data':<15}{'library':<21}{'MB/s':>11}{'ours : it':>11}{'goal':>7}")
     for row in rows:
         ratio = "" if row.ratio is None else f"{row.ratio:.2f}"
         goal = ""
         if row.goal is not None and row.ratio is not None:
             goal = f"{row.goal:g}".rjust(7) + ("  met" if row.is_met else "  not met")
         figure = f"{row.figure / 1e3:.1f} kB" if row.work == MEMORY else f"{row.figure / 1e6:.1f}"
-        print(f"{row.work:<18}{row.data:<12}{row.library:<21}{figure:>11}{ratio:>11}{goal}")
+        times = "" if row.times is None else "  p50 {:.1f} us, p99 {:.1f} us".format(*row.times)
+        print(f"{row.work:<22}{row.data:<15}{row.library:<21}{figure:>11}{ratio:>11}{goal}{times}")
 
 
 def print_flatness(path):

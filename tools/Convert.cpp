@@ -1,6 +1,5 @@
 #include "tools/Convert.h"
 
-#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -76,19 +75,6 @@ bool FSameFile(const std::string& path, std::FILE* file) {
     struct stat b {};
     return ::stat(path.c_str(), &a) == 0 && ::fstat(::fileno(file), &b) == 0 && S_ISREG(a.st_mode) &&
            a.st_dev == b.st_dev && a.st_ino == b.st_ino;
-}
-
-/// The standard output for records alone: the library tells unknown fields of the binary form on the standard
-/// output, which becomes the standard error for that, line by line. Null and words on failure.
-std::FILE* TakeStandardOutput() {
-    const int descriptor = ::fcntl(STDOUT_FILENO, F_DUPFD_CLOEXEC, 3);
-    std::FILE* out = descriptor >= 0 ? ::fdopen(descriptor, "wb") : nullptr;
-    if (out == nullptr || ::dup2(STDERR_FILENO, STDOUT_FILENO) < 0) {
-        std::perror("standard output");
-        return nullptr;
-    }
-    std::setvbuf(stdout, nullptr, _IOLBF, 0);
-    return out;
 }
 
 int ConvertInto(const ConvertOptions& options, std::FILE* in) {

@@ -70,6 +70,10 @@ ref<OrvoRpcWrapper> NewMessage(const FrameOptions& options, RoxMempool* pool, co
         words = "the body has no type; --request-type gives one";
         return nullptr;
     }
+    if (!FOneLine(requestType.View())) {
+        words = "the type of the body is not on one line";
+        return nullptr;
+    }
     ref<RequestWrapper> request;
     if (options.kind == "request") {
         RequestWrapper::ResponseCount count = RequestWrapper::RESPONSE_COUNT_SINGLE;

@@ -22,6 +22,11 @@ void Put(std::string_view text, std::FILE* out) {
     std::fwrite(text.data(), 1, text.size(), out);
 }
 
+/// All bytes of it, NULs included.
+RoxString ToText(std::string_view text) {
+    return RoxString::FromUtf8Bytes(nullptr, static_cast<unsigned>(text.size()), text.data());
+}
+
 void PutHeaders(const Dict& headers, std::FILE* out) {
     RoxStringArray names;
     headers.GetSortedNames(names);
@@ -52,7 +57,8 @@ void PutBody(OrvoRpcWrapper& message, RoxMempool* pool, std::FILE* out) {
         return;
     }
     std::string line(body.View());
-    const auto isBreak = [](char c) { return c == '\n' || c == '\r'; };
+    // The library takes the last two for blanks, other readers do not.
+    const auto isBreak = [](char c) { return c == '\n' || c == '\r' || c == '\v' || c == '\f'; };
     // Blanks around a value are lost on its reader.
     const bool isExact =
         line.front() == '{' && line.back() == '}' && std::none_of(line.begin(), line.end(), isBreak);
@@ -89,6 +95,12 @@ class Members {
         if (raw == nullptr || !Unquote(*raw, text)) Fail(std::string(name) + " is no string");
         return text;
     }
+    /// A text that can stand in a header line.
+    RoxString Line(const char* name) {
+        const std::string text = Text(name);
+        if (!FOneLine(text)) Fail(std::string(name) + " is not on one line");
+        return ToText(text);
+    }
     uint32_t Number(const char* name) {
         const std::string_view* const raw = Find(name);
         uint32_t number = 0;
@@ -109,26 +121,26 @@ class Members {
     std::string wordsM;
 };
 
-bool AddHeader(Dict& headers, const std::string& name, std::string_view raw) {
-    std::string text;
-    if (!Unquote(raw, text)) return false;
-    return headers.AddString(
-        RoxString::FromUtf8Bytes(nullptr, static_cast<unsigned>(name.size()), name.data()),
-        RoxString::FromUtf8Bytes(nullptr, static_cast<unsigned>(text.size()), text.data()));
-}
-
-ref<Dict> ReadHeaders(RoxMempool* pool, Members& members) {
-    ref<Dict> headers = MakeDict(pool);
+/// Adds the headers of the line: an object of strings and of arrays of strings.
+template <class Wrapper>
+void ReadHeaders(Members& members, Wrapper& message) {
     RawMembers vHeaders;
     const std::string_view* const raw = members.Find("headers");
     bool isRead = raw != nullptr && SplitObject(*raw, vHeaders);
     for (const auto& [name, value] : vHeaders) {
         std::vector<std::string_view> vValues;
         if (!SplitArray(value, vValues)) vValues = {value};
-        for (std::string_view each : vValues) isRead = AddHeader(*headers, name, each) && isRead;
+        for (std::string_view each : vValues) {
+            std::string text;
+            if (!Unquote(each, text)) {
+                isRead = false;
+            } else if (!FOneLine(name) || name.find(':') != std::string::npos || !FOneLine(text) ||
+                       !message.AddOptionalHeader(ToText(name), ToText(text))) {
+                members.Fail("a header is reserved, or none on one line: " + Quoted(name));
+            }
+        }
     }
     if (!isRead) members.Fail("headers is no object of strings");
-    return headers;
 }
 
 ref<LazyDict> ReadBody(RoxMempool* pool, Members& members, int version) {
@@ -152,21 +164,27 @@ ref<OrvoRpcWrapper> ReadRequest(RoxMempool* pool, Members& members) {
         members.Fail("responseCount is none of none, single and multiple");
     }
     const int version = static_cast<int>(members.Number("schemaVersion"));
-    return RequestWrapper::New(pool, members.Number("rpcId"), members.Text("requestType").c_str(), count,
-                               version, ReadBody(pool, members, version), ReadHeaders(pool, members));
+    const ref<RequestWrapper> request =
+        RequestWrapper::New(pool, members.Number("rpcId"), members.Line("requestType"), count, version,
+                            ReadBody(pool, members, version), nullptr);
+    ReadHeaders(members, *request);
+    return request;
 }
 
 ref<OrvoRpcWrapper> ReadUpdate(RoxMempool* pool, Members& members) {
-    return RequestUpdateWrapper::New(pool, members.Number("rpcId"), members.Text("requestType").c_str(),
-                                     ReadBody(pool, members, 0), ReadHeaders(pool, members));
+    const ref<RequestUpdateWrapper> update = RequestUpdateWrapper::New(
+        pool, members.Number("rpcId"), members.Line("requestType"), ReadBody(pool, members, 0), nullptr);
+    ReadHeaders(members, *update);
+    return update;
 }
 
 ref<OrvoRpcWrapper> ReadResponse(RoxMempool* pool, Members& members) {
     const ref<LazyDict> body = ReadBody(pool, members, 0);
     if (body == nullptr) return nullptr;
-    ref<ResponseWrapper> response = ResponseWrapper::New(
-        pool, members.Number("rpcId"), members.Flag("isFinal"), body, ReadHeaders(pool, members));
-    response->SetContentType(members.Text("contentType").c_str());
+    const ref<ResponseWrapper> response =
+        ResponseWrapper::New(pool, members.Number("rpcId"), members.Flag("isFinal"), body, nullptr);
+    response->SetContentType(members.Line("contentType"));
+    ReadHeaders(members, *response);
     return response;
 }
 
@@ -185,8 +203,8 @@ ref<OrvoRpcWrapper> ReadMessage(RoxMempool* pool, Members& members) {
 void WriteMessageLine(OrvoRpcWrapper& message, RoxMempool* pool, std::FILE* out) {
     if (auto* request = dynamic_cast<RequestWrapper*>(&message)) {
         const bool isUpdate = dynamic_cast<RequestUpdateWrapper*>(&message) != nullptr;
-        Put(Kind(isUpdate ? "requestUpdate" : "request", message) +
-                ",\"schemaVersion\":" + std::to_string(message.GetOrvoVersion().Number()) +
+        Put(Kind(isUpdate ? "requestUpdate" : "request", message) + ",\"schemaVersion\":" +
+                std::to_string(static_cast<uint32_t>(message.GetOrvoVersion().Number())) +
                 ",\"requestType\":" + Quoted(request->GetRequestType().View()) + ",\"responseCount\":\"" +
                 RequestWrapper::ResponseCountWord(request->GetResponseCount()) +
                 "\",\"contentType\":" + Quoted(request->GetContentType().View()),
@@ -205,13 +223,16 @@ void WriteMessageLine(OrvoRpcWrapper& message, RoxMempool* pool, std::FILE* out)
     Put("}\n", out);
 }
 
+bool FOneLine(std::string_view text) {
+    return text.find("\r\n") == std::string_view::npos;
+}
+
 ref<LazyDict> NewBody(RoxMempool* pool, std::string_view text, int version, std::string& words) {
     if (text.empty() || (text[0] != '{' && text[0] != ' ')) {
         words = "the body does not open with a brace";
         return nullptr;
     }
-    return LazyDict::FromJsonString(
-        pool, RoxString::FromUtf8Bytes(nullptr, static_cast<unsigned>(text.size()), text.data()), version);
+    return LazyDict::FromJsonString(pool, ToText(text), version);
 }
 
 ref<OrvoRpcWrapper> ReadMessageLine(RoxMempool* pool, const std::string& line, std::string& words) {

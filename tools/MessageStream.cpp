@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <utility>
 
 namespace sorn::tools {
 
@@ -20,25 +21,30 @@ RoxString ToText(const char* bytes, size_t n) {
 
 }  // namespace
 
-MessageStream::MessageStream(int descriptor, void (*willWait)())
-    : descriptorM(descriptor), willWaitM(willWait), packetizerM(nullptr) {}
+MessageStream::MessageStream(int descriptor, std::function<void()> willWait)
+    : descriptorM(descriptor), willWaitM(std::move(willWait)), packetizerM(nullptr) {}
 
 MessageStream::Piece MessageStream::Next(RoxString& bytes, RoxString& words) {
     packetizerM.Reset();
     packetizerM.lastError = RoxString();
     offsetM = takenM;
     for (;;) {
-        if (FBadFirstLine()) return TakeJunk(bytes, words);
+        if (FBadFirstLine()) {
+            words = packetizerM.lastError;
+            SkipJunk();
+            return JUNK;
+        }
         const size_t available = bufferM.size() - beginM;
         if (packetizerM.firstLineParsed && available >= packetizerM.packetLength) {
-            Take(packetizerM.packetLength, bytes);
+            bytes = ToText(bufferM.data() + beginM, packetizerM.packetLength);
+            Skip(packetizerM.packetLength);
             return MESSAGE;
         }
         switch (Fill()) {
             case SOME:
                 break;
             case NONE:
-                Take(available, bytes);
+                Skip(available);
                 return available == 0 ? END : UNFINISHED;
             case ERROR:
                 return FAILED;
@@ -53,22 +59,18 @@ bool MessageStream::FBadFirstLine() {
     return !packetizerM.lastError.FEmpty();
 }
 
-MessageStream::Piece MessageStream::TakeJunk(RoxString& bytes, RoxString& words) {
-    words = packetizerM.lastError;
+/// Nothing of it is kept but what may be the front of a first line: junk may be of any length.
+void MessageStream::SkipJunk() {
+    Skip(1);
     size_t next = 0;
-    size_t looked = beginM + 1;
-    while ((next = bufferM.find(magicG, looked)) == std::string::npos) {
-        const size_t tail = std::min(bufferM.size() - beginM, sizeof magicG - 2);  // may be the front of one
-        looked = std::max(beginM + 1, bufferM.size() - tail);
-        const size_t begin = beginM;
-        const Filled filled = Fill();
-        looked -= begin - beginM;
-        if (filled == SOME) continue;
+    while ((next = bufferM.find(magicG, beginM)) == std::string::npos) {
+        const size_t available = bufferM.size() - beginM;
+        Skip(available - std::min(available, sizeof magicG - 2));
+        if (Fill() == SOME) continue;
         next = bufferM.size();
         break;
     }
-    Take(next - beginM, bytes);
-    return JUNK;
+    Skip(next - beginM);
 }
 
 MessageStream::Filled MessageStream::Fill() {
@@ -85,8 +87,7 @@ MessageStream::Filled MessageStream::Fill() {
     return n > 0 ? SOME : n == 0 ? NONE : ERROR;
 }
 
-void MessageStream::Take(size_t n, RoxString& bytes) {
-    bytes = ToText(bufferM.data() + beginM, n);
+void MessageStream::Skip(size_t n) {
     beginM += n;
     takenM += n;
 }

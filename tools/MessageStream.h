@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <string>
 
 #include "rox/RoxString.h"
@@ -13,30 +14,32 @@ class MessageStream {
  public:
     enum Piece {
         MESSAGE,     ///< as many bytes as its first line says
-        JUNK,        ///< a bad first line and all up to the next text that looks like one
+        JUNK,        ///< a bad first line and all up to the next text that looks like one; it is not kept
         UNFINISHED,  ///< the stream ended within it
         END,
         FAILED,  ///< reading failed, told by errno
     };
 
     /// `willWait` is called before every read.
-    MessageStream(int descriptor, void (*willWait)());
+    MessageStream(int descriptor, std::function<void()> willWait);
 
-    /// The next piece of the stream and its bytes; with JUNK the words about the first line.
+    /// The next piece of the stream: of a MESSAGE its bytes, of JUNK the words about the first line.
     Piece Next(RoxString& bytes, RoxString& words);
     /// Where the piece began, in bytes from the start of the stream.
     uint64_t GetOffset() const { return offsetM; }
+    /// Bytes of the piece, but of one that FAILED.
+    uint64_t GetLength() const { return takenM - offsetM; }
 
  private:
     enum Filled { SOME, NONE, ERROR };
 
     Filled Fill();
-    Piece TakeJunk(RoxString& bytes, RoxString& words);
-    void Take(size_t n, RoxString& bytes);
+    void SkipJunk();
+    void Skip(size_t n);
     bool FBadFirstLine();
 
     int descriptorM;
-    void (*willWaitM)();
+    std::function<void()> willWaitM;
     OrvoRpcV2Packetizer packetizerM;
     std::string bufferM;
     size_t beginM = 0;  ///< in the buffer, of what was not given yet

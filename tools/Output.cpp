@@ -1,5 +1,8 @@
 #include "tools/Output.h"
 
+#include <fcntl.h>
+#include <unistd.h>
+
 #include <cstring>
 
 namespace sorn::tools {
@@ -23,6 +26,17 @@ std::FILE* OpenFile(const std::string& path, const char* mode, std::FILE* standa
     std::FILE* const file = std::fopen(path.c_str(), mode);
     if (file == nullptr) std::perror(path.c_str());
     return file;
+}
+
+std::FILE* TakeStandardOutput() {
+    const int descriptor = ::fcntl(STDOUT_FILENO, F_DUPFD_CLOEXEC, 3);
+    std::FILE* out = descriptor >= 0 ? ::fdopen(descriptor, "wb") : nullptr;
+    if (out == nullptr || ::dup2(STDERR_FILENO, STDOUT_FILENO) < 0) {
+        std::perror("standard output");
+        return nullptr;
+    }
+    std::setvbuf(stdout, nullptr, _IOLBF, 0);
+    return out;
 }
 
 bool FinishOutput(std::FILE* file) {

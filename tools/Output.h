@@ -23,6 +23,11 @@ class FileSink final : public kelbaselib::Bytesink {
 /// error, when that fails.
 std::FILE* OpenFile(const std::string& path, const char* mode, std::FILE* standard);
 
+/// The standard output for results alone: the library tells unknown fields of the binary form on the standard
+/// output, which becomes the standard error for that, line by line. Null and words on failure. The caller
+/// closes it.
+std::FILE* TakeStandardOutput();
+
 /// Flushes. False, and words on standard error, when anything since the file was opened could not be written.
 bool FinishOutput(std::FILE* file);
 

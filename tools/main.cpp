@@ -6,6 +6,9 @@
 #include "tools/Describe.h"
 #include "tools/ExitCode.h"
 #include "tools/Frame.h"
+#include "tools/PutAndRemove.h"
+#include "tools/Send.h"
+#include "tools/Serve.h"
 #include "tools/Unframe.h"
 
 namespace {
@@ -92,6 +95,62 @@ void AddUnframe(CLI::App& app, sorn::tools::UnframeOptions& options) {
     command->add_option("IN", options.inPath, "Input file (default: standard input)")->option_text("IN");
 }
 
+void AddBus(CLI::App* command, std::string& bus, bool& trace) {
+    command
+        ->add_option(
+            "--bus", bus,
+            "Address of the bus (default: what SORN_BUS says, else sorn-bus in the folder of the session)")
+        ->option_text("ADDRESS");
+    command->add_flag("--trace", trace, "Show every message on standard error, as unframe does");
+}
+
+/// Adds "sorn send".
+void AddSend(CLI::App& app, sorn::tools::SendOptions& options) {
+    using sorn::tools::SendOptions;
+    CLI::App* command =
+        app.add_subcommand("send", "Sends a request to the service and shows what comes back");
+    AddBus(command, options.bus, options.trace);
+    CLI::Option_group* ways = command->add_option_group("ways");
+    const auto addWay = [&](const char* name, SendOptions::Way way, const char* text) {
+        ways->add_flag_callback(
+            name, [&options, way] { options.way = way; }, text);
+    };
+    addWay("--wait", SendOptions::WAIT, "Wait for one response (the default)");
+    addWay("--forget", SendOptions::FORGET, "Expect no response");
+    addWay("--watch", SendOptions::WATCH, "Show all responses, until the last one or an interrupt");
+    ways->require_option(0, 1);
+    command->add_option("REQUEST", options.inPath, "File with the request's JSON (default: standard input)")
+        ->option_text("REQUEST.json");
+}
+
+/// Adds "sorn put" or "sorn rm".
+void AddPutOrRemove(CLI::App& app, const char* name, const char* text, const char* action,
+                    sorn::tools::PutAndRemoveOptions& options) {
+    CLI::App* command = app.add_subcommand(name, text);
+    options.action = action;
+    AddBus(command, options.bus, options.trace);
+    command->add_option("IN", options.inPath, "File of records, one a line (default: standard input)")
+        ->option_text("RECORDS.jsonl");
+}
+
+/// Adds "sorn serve".
+void AddServe(CLI::App& app, sorn::tools::ServeOptions& options) {
+    CLI::App* command = app.add_subcommand("serve", "Runs the development service until it is interrupted");
+    command
+        ->add_option("--bus", options.bus,
+                     "Address of the bus (default: what SORN_BUS says, else sorn-bus in the folder of the "
+                     "session)")
+        ->option_text("ADDRESS");
+    command->add_option("--db", options.database, "File that keeps the records (default: in memory)")
+        ->option_text("FILE");
+    command
+        ->add_option("--load", options.vLoads,
+                     "File of records to store at the start, one a line; may be given several times")
+        ->option_text("FILE.jsonl")
+        ->allow_extra_args(false);
+    command->add_flag("--trace", options.trace, "Show every message on standard output, as unframe does");
+}
+
 int Run(int argc, char** argv) {
     CLI::App app{"The records of a digital video recorder platform: looks at their schema and converts them",
                  "sorn"};
@@ -105,6 +164,16 @@ int Run(int argc, char** argv) {
     AddConvert(app, convert);
     AddFrame(app, frame);
     AddUnframe(app, unframe);
+    sorn::tools::SendOptions send;
+    sorn::tools::PutAndRemoveOptions put;
+    sorn::tools::PutAndRemoveOptions remove;
+    AddSend(app, send);
+    AddPutOrRemove(app, "put", "Stores records in the development service", "put", put);
+    AddPutOrRemove(app, "rm",
+                   "Removes the records that have all of the fields given from the development service",
+                   "remove", remove);
+    sorn::tools::ServeOptions serve;
+    AddServe(app, serve);
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
@@ -112,6 +181,10 @@ int Run(int argc, char** argv) {
     }
     if (app.got_subcommand("describe")) return sorn::tools::Describe(describe);
     if (app.got_subcommand("frame")) return sorn::tools::Frame(frame);
+    if (app.got_subcommand("send")) return sorn::tools::Send(send);
+    if (app.got_subcommand("serve")) return sorn::tools::Serve(serve);
+    if (app.got_subcommand("put")) return sorn::tools::PutOrRemove(put);
+    if (app.got_subcommand("rm")) return sorn::tools::PutOrRemove(remove);
     if (app.got_subcommand("unframe")) return sorn::tools::Unframe(unframe);
     return sorn::tools::Convert(convert);
 }

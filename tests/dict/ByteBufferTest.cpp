@@ -264,4 +264,33 @@ TEST_F(Rox1ByteBufferCoreTest, MoreThanTheLimitAsserts) {
     EXPECT_DEATH(buffer->AppendBytes(&byte, UINT32_MAX), "too many");
 }
 
+TEST_F(RoxByteBufferTest, OfATextSharesItsBytes) {
+    ref<rox::ByteBuffer> slice;
+    {
+        const RoxString text(&pool, "0123456789");
+        const ref<rox::ByteBuffer> all = rox::ByteBuffer::NewOfText(&pool, text, 0, 10);
+        EXPECT_EQ(all->GetData(), reinterpret_cast<const unsigned char*>(text.Utf8()));
+        EXPECT_EQ(all->GetLength(), 10u);
+        EXPECT_EQ(all->GetCapacity(), 0u);
+        slice = rox::ByteBuffer::NewSlice(&pool, rox::ByteBuffer::NewOfText(&pool, text, 2, 5), 1, 3);
+        EXPECT_EQ(slice->GetData(), all->GetData() + 3);
+    }
+    // It holds the text, which nobody else does any more.
+    EXPECT_EQ(std::string(reinterpret_cast<const char*>(slice->GetData()), slice->GetLength()), "345");
+}
+
+TEST_F(RoxByteBufferTest, OfNoTextHoldsNothing) {
+    const ref<rox::ByteBuffer> empty = rox::ByteBuffer::NewOfText(&pool, RoxString(), 0, 0);
+    EXPECT_TRUE(empty->FEmpty());
+    EXPECT_EQ(empty->GetData(), nullptr);
+    EXPECT_TRUE(rox::ByteBuffer::NewOfText(&pool, RoxString("abc"), 3, 0)->FEmpty());
+}
+
+TEST_F(RoxByteBufferTest, OutsideATextEndsTheProcess) {
+    const RoxString text("abc");
+    EXPECT_DEATH(rox::ByteBuffer::NewOfText(&pool, text, 4, 0), "range outside its text");
+    EXPECT_DEATH(rox::ByteBuffer::NewOfText(&pool, text, 1, 3), "range outside its text");
+    EXPECT_DEATH(rox::ByteBuffer::NewOfText(&pool, text, 1, UINT32_MAX), "range outside its text");
+}
+
 }  // namespace

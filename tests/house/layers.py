@@ -25,6 +25,7 @@ LAYERS = {
     "rox": Layer("platform/rox", "rox", ()),
     "kelbaselib": Layer("platform/kelbaselib", "kelbaselib", ("rox",)),
     "model": Layer(f"{SORN}/model", "sorn/model", ("rox",)),
+    "vkbus": Layer("platform/vkbus", "vkbus", ("rox",)),
     # The generator's output, in the build folder: records know the layers above by forward declarations only.
     "sornschema": Layer("sornschema", "sornschema", ("rox", "model")),
     "dict": Layer(f"{SORN}/dict", "sorn/dict", PLATFORM + ("model",)),
@@ -39,21 +40,26 @@ LAYERS = {
         f"{SORN}/rpc", "sorn/rpc", PLATFORM + ("model", "sornschema", "dict", "json", "convert", "binary", "lazy")
     ),
     "sorn": Layer(SORN, "sorn", LIBRARY),  # sorn.h, the header of all
-    "tools": Layer("tools", "tools", LIBRARY + ("sorn",)),
+    "client": Layer("client", "client", LIBRARY + ("sorn", "vkbus")),
+    "service": Layer("service", "service", LIBRARY + ("vkbus", "client")),
+    "tools": Layer("tools", "tools", LIBRARY + ("sorn", "vkbus", "client", "service")),
     "bench": Layer("bench", "bench", LIBRARY + ("sorn",)),
     "bench/common": Layer("bench/common", "common", ()),
     **{
         f"bench/{name}": Layer(f"bench/{name}", name, LIBRARY + ("sorn", "bench/common"))
         for name in ("text", "codecs", "messages", "instructions")
     },
+    "bench/bus": Layer("bench/bus", "bus", LIBRARY + ("sorn", "vkbus", "client", "bench/common")),
     "fuzz/support": Layer("fuzz/support", "fuzz/support", LIBRARY + ("sorn",)),
     "fuzz": Layer("fuzz", "fuzz", LIBRARY + ("sorn", "fuzz/support")),
-    "examples": Layer("examples", "examples", LIBRARY + ("sorn",)),
+    "examples": Layer("examples", "examples", LIBRARY + ("sorn", "vkbus", "client")),
     "tests/support": Layer("tests/support", "support", ()),
     # The tests of a platform library stand without the rest; those of libsorn.so link all of it, and may use fixtures of
     # the tests that stand before them.
     "tests/rox": Layer("tests/rox", "rox_test", ("rox", "tests/support")),
     "tests/kelbaselib": Layer("tests/kelbaselib", "kelbaselib_test", PLATFORM + ("tests/support",)),
+    "tests/service": Layer("tests/service", "service_test", LIBRARY + ("vkbus", "client", "service", "tests/support")),
+    "tests/vkbus": Layer("tests/vkbus", "vkbus_test", ("rox", "vkbus", "client", "tests/support")),
     **{
         f"tests/{name}": Layer(
             f"tests/{name}",
@@ -84,7 +90,7 @@ def layer_of_include(bracket, path, own):
     if bracket == '"' and not prefix:
         return own  # beside the including file
     found = next((layer for layer, (_, each, _) in LAYERS.items() if each == prefix), None)
-    if found is None and (bracket == '"' or prefix.split("/")[0] in ("sorn", "rox", "kelbaselib")):
+    if found is None and (bracket == '"' or prefix.split("/")[0] in ("sorn", "rox", "kelbaselib", "vkbus")):
         return ""
     return found
 

@@ -1,6 +1,7 @@
 """sorn frame and sorn unframe: messages made, taken apart, and put together again."""
 
 import json
+import os
 import subprocess
 import unittest
 
@@ -50,6 +51,12 @@ class Frame(unittest.TestCase):
         for text, words in ((b"", b"the body does not open with a brace\n"), (b"[1]", b"the body does not open with a brace\n"),
                             (b"{}", b"the body has no type; --request-type gives one\n")):
             self.assertEqual(run("frame", "request", "--rpc-id", "1", text=text), (SOME_REFUSED, b"", words), text)
+
+    def test_a_type_cannot_add_headers(self):
+        words = b"the type of the body is not on one line\n"
+        for kind in ("request", "requestUpdate"):
+            self.assertEqual(run("frame", kind, "--rpc-id", "7", text=b'{"type":"x\\r\\nRpcId: 9"}'), (SOME_REFUSED, b"", words))
+            self.assertEqual(run("frame", kind, "--rpc-id", "7", "--request-type", "x\r\nRpcId: 9", text=BODY), (SOME_REFUSED, b"", words))
 
     def test_largest_body(self):
         body = b'{"a":"%s"}' % (b"x" * (0x500000 - 8))
@@ -101,9 +108,13 @@ class Unframe(unittest.TestCase):
     def test_put_together_again(self):
         odd = [message(b"Content-Type: application/json", b"IsFinal: false", b"RpcId: 0", b"Type: response", b"x: \"\\\x01", body=body)
                for body in (b'{"a": 1 ,\r\n"a":"\\u00e9\\n"}', b'{"broken', b"{bare}", b' {}', b'{"a":"\xff"}', b'{"a":"\\\\u0041')]
+        # A version is 32 bits without a sign, and a name of a type may hold any character.
+        odd += [REQUEST.replace(b"SchemaVersion: 42", b"SchemaVersion: %d" % version).replace(b"ORPC/2 131", b"ORPC/2 139")
+                for version in (2147483648, 4294967295)]
+        odd += [REQUEST.replace(b"recordingSearch\r", b"recording\x00Sear\"\r")]
         stream = b"".join([REQUEST, UPDATE, *odd, RESPONSE, CANCEL])
         code, lines, err = run("unframe", text=stream)
-        self.assertEqual((code, err, lines.count(b"\n")), (DONE, b"", 10))
+        self.assertEqual((code, err, lines.count(b"\n")), (DONE, b"", 13))
         self.assertEqual(run("frame", "--lines", text=lines), (DONE, stream, b""))
 
     def test_lines_of_other_writers(self):
@@ -123,6 +134,12 @@ class Unframe(unittest.TestCase):
             (b'{"kind":"response","rpcId":1,"isFinal":1,"contentType":"","headers":{},"body":{}}', b"isFinal is no bool"),
             (b'{"kind":"response","rpcId":1,"isFinal":true,"contentType":"","headers":{"a":1},"body":{}}', b"headers is no object of strings"),
             (b'{"kind":"response","rpcId":1,"isFinal":true,"contentType":"","headers":{}}', b"body is missing"),
+            (b'{"kind":"response","rpcId":1,"isFinal":true,"contentType":"","headers":{"RpcId":"2"},"body":{}}', b'a header is reserved, or none on one line: "RpcId"'),
+            (b'{"kind":"response","rpcId":1,"isFinal":true,"contentType":"","headers":{"a:b":"c"},"body":{}}', b'a header is reserved, or none on one line: "a:b"'),
+            (b'{"kind":"response","rpcId":1,"isFinal":true,"contentType":"","headers":{"a\\r\\nb":"c"},"body":{}}', b"a header is reserved, or none on one line: "),
+            (b'{"kind":"response","rpcId":1,"isFinal":true,"contentType":"","headers":{"a":["b","c\\r\\nRpcId: 2"]},"body":{}}', b'a header is reserved, or none on one line: "a"'),
+            (b'{"kind":"response","rpcId":1,"isFinal":true,"contentType":"\\r\\n","headers":{},"body":{}}', b"contentType is not on one line"),
+            (b'{"kind":"requestUpdate","rpcId":1,"requestType":"x\\r\\ny","headers":{},"body":{}}', b"requestType is not on one line"),
             (b'{"kind":"response","rpcId":1,"isFinal":true,"contentType":"","headers":{},"body":[]}', b"the body does not open"),
             (b'{"kind":"response","rpcId":1,"isFinal":true,"contentType":"\\ud800","headers":{},"body":{}}', b"contentType is no string"),
         ):
@@ -157,6 +174,34 @@ class Unframe(unittest.TestCase):
             self.assertEqual(run("unframe", text=stream), (SOME_REFUSED, out, words), stream[:100])
         self.assertEqual(run("unframe"), (DONE, b"", b""))
         self.assertEqual(run("unframe", "/nowhere/in")[0], WRONG_USAGE)
+
+    def test_blanks_that_other_readers_refuse(self):
+        stream = b"".join(message(b"Content-Type: application/json", b"IsFinal: false", b"RpcId: 1", b"Type: response", body=body)
+                          for body in (b'{\x0b"a":[1\x0c]}', b'{"a":[1]}\x0c', b' \x0b{"a":[1]}'))
+        code, lines, _ = self.unframed(stream)
+        self.assertEqual((code, [line["body"] for line in lines]), (DONE, [{"a": [1]}] * 3))
+        self.assertEqual(run("frame", "--lines", text=run("unframe", text=stream)[1]), (DONE, stream, b""))
+
+    def test_unknown_fields_of_a_binary_body_are_told_on_standard_error(self):
+        body = b"\xea\x7f\x02\x20\x01"  # struct 2045, 2 bytes of fields: number 4, which it does not have, is 1
+        code, lines, err = self.unframed(message(b"RpcId: 1", b"Type: response", body=body) + CANCEL)
+        self.assertEqual((code, [line["kind"] for line in lines]), (DONE, ["response", "cancel"]))
+        self.assertEqual(lines[0]["body"], {"host": "", "port": 0, "type": "hostAndPort"})
+        self.assertEqual(set(err.splitlines()), {b"field number '4' out of range in 'hostAndPort'"})
+
+    def test_junk_is_not_kept(self):
+        junk = b"z" * (1 << 20)
+        with subprocess.Popen([*TOOL, "unframe"], stdin=subprocess.PIPE, stdout=subprocess.PIPE, stderr=subprocess.PIPE) as tool:
+            for _ in range(400):
+                tool.stdin.write(junk)
+            tool.stdin.write(CANCEL)
+            tool.stdin.close()
+            self.assertEqual(tool.stdout.read(), b'{"kind":"cancel","rpcId":7}\n')
+            self.assertEqual(tool.stderr.read(), b"byte 0: First line too long; %d bytes left out\n" % (400 << 20))
+            _, status, usage = os.wait4(tool.pid, 0)
+            tool.returncode = os.waitstatus_to_exitcode(status)
+        self.assertEqual(tool.returncode, SOME_REFUSED)
+        self.assertLess(usage.ru_maxrss, 300 << 10)  # KiB
 
     def test_messages_go_out_as_they_come(self):
         with subprocess.Popen([*TOOL, "unframe"], stdin=subprocess.PIPE, stdout=subprocess.PIPE) as tool:

@@ -17,7 +17,7 @@ from tools.command import DONE, ROOT, SOME_REFUSED, TOOL, WRONG_USAGE, run
 
 class Usage(unittest.TestCase):
     def test_help_on_every_level(self):
-        for arguments in (["--help"], *([each, "--help"] for each in ("describe", "convert", "frame", "unframe"))):
+        for arguments in (["--help"], *([each, "--help"] for each in ("describe", "convert", "frame", "unframe", "serve", "send", "put", "rm"))):
             code, out, err = run(*arguments)
             self.assertEqual((code, err), (DONE, b""), arguments)
             self.assertIn(b"Usage: sorn", out)
@@ -51,7 +51,7 @@ class Usage(unittest.TestCase):
             return set(done.stdout.split())
 
     def test_completion(self):
-        for command in ("describe", "convert", "frame", "unframe"):
+        for command in ("describe", "convert", "frame", "unframe", "serve", "send", "put", "rm"):
             helped = run(command, "--help")[1].decode().replace(",", " ").split()
             options = {word for word in helped if word.startswith("--")}
             self.assertEqual(self.completions(command, "--"), options, command)

@@ -34,18 +34,16 @@ TEST_F(RandomWriterTest, AllStructs) {
         const StructInfo* const info = Schema::vStructDefG[id];
         // Its lists of lazy bodies are repeated names in dictionaries.
         if (info == nullptr || std::string(info->name).starts_with("everyType")) continue;
-        for (int round = 0; round < 3; ++round) {
-            const ref<SornObject> object = records.Make(*info);
-            if (Typed(object).find("everyType") != std::string::npos) continue;
-            for (const int version : {0, 7, 11, 12, 21, 22, 25, 26, 42}) {
-                const std::string typed = Typed(object, version);
-                if (version != 0 && FOlderForms(typed)) continue;
-                EXPECT_EQ(Sorted(typed), Sorted(Json(object, version))) << info->name << " at " << version;
-                ++nCompared;
-            }
+        const ref<SornObject> object = records.Make(*info);
+        if (Typed(object).find("everyType") != std::string::npos) continue;
+        for (const int version : {0, 7, 11, 12, 21, 22, 25, 26, 42}) {
+            const std::string typed = Typed(object, version);
+            if (version != 0 && FOlderForms(typed)) continue;
+            EXPECT_EQ(Sorted(typed), Sorted(Json(object, version))) << info->name << " at " << version;
+            ++nCompared;
         }
     }
-    EXPECT_GT(nCompared, 4000u);
+    EXPECT_GT(nCompared, 1300u);
 }
 
 }  // namespace sorntest

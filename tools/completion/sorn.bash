@@ -2,7 +2,7 @@
 _sorn() {
     local word=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]} command=${COMP_WORDS[1]:-}
     if [ "$COMP_CWORD" -eq 1 ]; then
-        mapfile -t COMPREPLY < <(compgen -W 'describe convert frame unframe --help --help-all' -- "$word")
+        mapfile -t COMPREPLY < <(compgen -W 'describe convert frame unframe serve send put rm --help --help-all' -- "$word")
         return
     fi
     case $previous in
@@ -21,7 +21,10 @@ _sorn() {
             ;;
         frame:*) mapfile -t COMPREPLY < <(compgen -W 'request requestUpdate response cancel' -f -- "$word") ;;
         unframe:-*) mapfile -t COMPREPLY < <(compgen -W '--parse-body --help --help-all' -- "$word") ;;
-        convert:* | unframe:*) mapfile -t COMPREPLY < <(compgen -f -- "$word") ;;
+        serve:-*) mapfile -t COMPREPLY < <(compgen -W '--bus --db --load --trace --help --help-all' -- "$word") ;;
+        send:-*) mapfile -t COMPREPLY < <(compgen -W '--bus --wait --forget --watch --trace --help --help-all' -- "$word") ;;
+        put:-* | rm:-*) mapfile -t COMPREPLY < <(compgen -W '--bus --trace --help --help-all' -- "$word") ;;
+        convert:* | unframe:* | serve:* | send:* | put:* | rm:*) mapfile -t COMPREPLY < <(compgen -f -- "$word") ;;
     esac
 }
 complete -F _sorn sorn

@@ -10,8 +10,8 @@ namespace sorn {
 /// The first line of an ORPC/2 message.
 struct FirstLine {
     static constexpr char magicG[] = "ORPC/2";
-    /// Bytes within which a line that keeps the limits ends, counting one to spare; an input as long and
-    /// without CR, LF is none.
+    /// An input of so many bytes without CR, LF may still become a line, a longer one may not: a line that
+    /// keeps the limits takes 24 bytes with its end, and one is to spare.
     static constexpr uint32_t maxUnfinishedG = 25;
 
     uint32_t headerLength = 0;
@@ -20,8 +20,8 @@ struct FirstLine {
 
     /// Reads the line at the start of the input. False with `length` 0 and nothing else changed: more input
     /// is needed. False with a length: a bad line, words replace `error`, lengths read before the fault stay.
-    /// An input that is too long to hold no CR, LF is one line of all its bytes: true, with words and the
-    /// other lengths as they were.
+    /// An input that is too long for one without CR, LF is one line of all its bytes: true, with words and
+    /// the other lengths as they were.
     bool Parse(std::string_view input, RoxString& error);
 };
 

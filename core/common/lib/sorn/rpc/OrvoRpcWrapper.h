@@ -32,7 +32,8 @@ class OrvoRpcWrapper : public RoxCore {
     /// The name of the body's type; "response" for a response whose type is not known yet, "Cancel" for a
     /// cancel.
     virtual RoxString GetTypeName() = 0;
-    /// A new dictionary in the pool: the reserved headers of the kind, then the optional ones.
+    /// A new dictionary in the pool: the reserved headers of the kind, then the optional ones, whose texts it
+    /// shares with the message: it must die before the message's pool.
     virtual ref<Dict> HeadersToDict(RoxMempool* pool) const = 0;
     /// The body as LazyDict::ToDict gives it; null without a body.
     virtual ref<Dict> BodyToDict();
