@@ -2,6 +2,7 @@
 
 /// All of the library but the record classes, which are `sornschema/<Record>.h` and `sornschema/all.h`.
 
+#include "client/VkLocalorvoClient.h"
 #include "sorn/binary/GoogleInt.h"
 #include "sorn/binary/ProtoBuf.h"
 #include "sorn/binary/ProtoBufByteOutputStream.h"
