@@ -2,6 +2,10 @@
 
 #include "vkbus/VkBus.h"
 
+namespace {
+thread_local MonitoringActivity* currentG = nullptr;
+}  // namespace
+
 MonitoringActivity::Listener::Listener(MonitoringActivity* activity)
     : RoxListenerInterface<RoxFdEvent>([](RoxListenerInterface<RoxFdEvent>* listener) {
           static_cast<Listener*>(listener)->pActivity->ProcessBusEvent();
@@ -21,7 +25,17 @@ MonitoringActivity::MonitoringActivity(const ref<VkLocalorvoClient>& client,
 
 MonitoringActivity::~MonitoringActivity() = default;
 
+void MonitoringActivity::EndWatchOfThread() {
+    if (currentG != nullptr) currentG->EndWatch();
+}
+
+void MonitoringActivity::EndWatch() {
+    fdM->ClearListener();
+    fdM->ClearFd();
+}
+
 void MonitoringActivity::ActivityStart() {
+    currentG = this;
     fdM->SetListener(&listenerM);
     // The connection may be lost by now: then there is nothing to watch.
     connectionM = clientM->GetHandles().connection;
@@ -34,7 +48,7 @@ void MonitoringActivity::ProcessBusEvent() {
 }
 
 void MonitoringActivity::ActivityStop() {
-    fdM->ClearListener();
-    fdM->ClearFd();
+    EndWatch();
+    currentG = nullptr;
     clientM = nullptr;
 }

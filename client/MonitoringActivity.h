@@ -12,6 +12,10 @@ class MonitoringActivity : public RoxActivity {
                        const ref<RoxCoreSemaphore>& stopped, const ref<RoxCoreSemaphore>& started);
     ~MonitoringActivity() override;
 
+    /// If the caller is on the thread of one: it watches its connection, which is about to be closed, no
+    /// longer.
+    static void EndWatchOfThread();
+
     void ActivityStart() override;
     void ActivityStop() override;
 
@@ -23,6 +27,7 @@ class MonitoringActivity : public RoxActivity {
     };
 
     void ProcessBusEvent();
+    void EndWatch();
 
     ref<VkLocalorvoClient> clientM;
     uint32_t connectionM = 0;  // the one that it is for: the client may have another by now

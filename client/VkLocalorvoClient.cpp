@@ -4,6 +4,7 @@
 #include "client/ClientLockLevel.h"
 #include "client/DeliveryOfThread.h"
 #include "client/MonitoringActivity.h"
+#include "rox/RoxMonotonicTime.h"
 #include "rox/RoxMutexHold.h"
 #include "rox/RoxSpinLockHold.h"
 #include "rox/RoxWorkStack.h"
@@ -156,22 +157,21 @@ bool VkLocalorvoClient::TryConnect() {
 
 void VkLocalorvoClient::Disconnect() {
     if (Lifecycle::FHeldHere(this)) return;
-    // Not under the lifecycle's lock: the activity may be on its way here.
-    AwaitEnd(StopMonitoring());
-    Semaphores startedMeanwhile;
-    {
+    for (;;) {
+        // Not under the lifecycle's lock: the activity may be on its way here.
+        AwaitEnd(StopMonitoring());
         Lifecycle lifecycle(*this);
-        startedMeanwhile = StopMonitoring();
+        if (FMonitored()) continue;  // again, by another thread
         CancelPending(0);
         Close();
+        return;
     }
-    AwaitEnd(startedMeanwhile);
 }
 
 /// Sends a cancel for every request that is pending now, whatever comes of it, and removes the request.
 /// Without a connection each makes attempts to get one, which would again cancel all that is pending if they
 /// fail; so all of that is one loop, which gives up after maxConnectAttemptsG attempts in a row, nAttempts of
-/// them made before.
+/// them made before, and when teardownLimitG has passed.
 void VkLocalorvoClient::CancelPending(unsigned nAttempts) {
     RoxWorkStack<uint32_t, 16> pending(GetMempool());
     {
@@ -180,11 +180,15 @@ void VkLocalorvoClient::CancelPending(unsigned nAttempts) {
             pending.Push(requestTableM.KeyOf(iter));
         }
     }
-    for (; !pending.FEmpty(); pending.Pop()) {
+    const int64_t start = RoxMonotonicTime::Now();
+    const auto isLate = [start] {
+        return RoxMonotonicTime::ToNanoseconds(RoxMonotonicTime::Now() - start) >= teardownLimitG;
+    };
+    for (; !pending.FEmpty() && !isLate(); pending.Pop()) {
         const uint32_t rpcId = pending.Top();
         if (FindRequest(rpcId) == nullptr) continue;  // it has ended by itself
         while (!FConnected()) {
-            if (nAttempts == maxConnectAttemptsG) return;
+            if (nAttempts == maxConnectAttemptsG || isLate()) return;
             ++nAttempts;
             TryConnect();
         }
@@ -214,6 +218,7 @@ void VkLocalorvoClient::Close() {
     const Handles handles = GetHandles();
     SetHandles(0, 0);
     ClearTables();
+    MonitoringActivity::EndWatchOfThread();
     if (handles.session != 0) VkBusCloseSession(handles.session);
     if (handles.connection != 0) VkBusCloseConnection(handles.connection);
 }

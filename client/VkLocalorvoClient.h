@@ -96,6 +96,9 @@ class VkLocalorvoClient : public RoxCore {
     static constexpr int64_t waitLimitG = 5'000'000'000;
     /// Attempts in a row to connect for the sake of telling a cancel; then pending requests are dropped.
     static constexpr unsigned maxConnectAttemptsG = 1000;
+    /// Nanoseconds after which a teardown tells no more cancels and makes no more attempts: a service that
+    /// takes a connection and then neither answers nor reads holds up each for seconds.
+    static constexpr int64_t teardownLimitG = 10'000'000'000;
 
     ~VkLocalorvoClient() override;
 

@@ -39,8 +39,8 @@ LAYERS = {
     "rpc": Layer(
         f"{SORN}/rpc", "sorn/rpc", PLATFORM + ("model", "sornschema", "dict", "json", "convert", "binary", "lazy")
     ),
-    "sorn": Layer(SORN, "sorn", LIBRARY),  # sorn.h, the header of all
-    "client": Layer("client", "client", LIBRARY + ("sorn", "vkbus")),
+    "client": Layer("client", "client", LIBRARY + ("vkbus",)),
+    "sorn": Layer(SORN, "sorn", LIBRARY + ("vkbus", "client")),  # sorn.h, the header of all
     "service": Layer("service", "service", LIBRARY + ("vkbus", "client")),
     "tools": Layer("tools", "tools", LIBRARY + ("sorn", "vkbus", "client", "service")),
     "bench": Layer("bench", "bench", LIBRARY + ("sorn",)),
@@ -60,6 +60,10 @@ LAYERS = {
     "tests/kelbaselib": Layer("tests/kelbaselib", "kelbaselib_test", PLATFORM + ("tests/support",)),
     "tests/service": Layer("tests/service", "service_test", LIBRARY + ("vkbus", "client", "service", "tests/support")),
     "tests/vkbus": Layer("tests/vkbus", "vkbus_test", ("rox", "vkbus", "client", "tests/support")),
+    "tests/client": Layer("tests/client", "client_test", LIBRARY + ("sorn", "vkbus", "client", "tests/support")),
+    "tests/client_bus": Layer(
+        "tests/client_bus", "client_bus_test", LIBRARY + ("sorn", "vkbus", "client", "tests/support", "tests/client")
+    ),
     **{
         f"tests/{name}": Layer(
             f"tests/{name}",
