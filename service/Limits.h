@@ -29,6 +29,9 @@ struct Limits {
     /// Messages to open streams that are sent before others are served again, and bytes of them.
     size_t maxTurnMessages = 64;
     size_t maxTurnBytes = 1u << 20;
+    /// Nanoseconds after which a turn begins no further list or message: a list looks at all records of its
+    /// type.
+    int64_t maxTurnNanoseconds = 20'000'000;
 };
 
 /// Bytes of the whole store; records for which there is no room are refused.

@@ -158,13 +158,25 @@ int64_t Store::Number(const char* sql) {
 
 bool Store::Fail(Failure& failure) {
     const int result = sqlite3_errcode(databaseM.get());
-    if (result == SQLITE_FULL) return failure.Set(ErrorCode::resourceUnavailableG, "the store is full");
-    return failure.Set(ErrorCode::internalErrorG,
-                       std::string("the store: ") + sqlite3_errmsg(databaseM.get()));
+    if (result == SQLITE_FULL) {
+        failure.Set(ErrorCode::resourceUnavailableG, "the store is full");
+    } else {
+        failure.Set(ErrorCode::internalErrorG, std::string("the store: ") + sqlite3_errmsg(databaseM.get()));
+    }
+    if (isBatchM) lossM = failure;
+    return false;
+}
+
+/// SQLite ends a transaction when memory or disk fails it; what follows would be stored on its own.
+bool Store::FBatchLost(Failure& failure) const {
+    if (!isBatchM || sqlite3_get_autocommit(databaseM.get()) == 0) return false;
+    failure = lossM;
+    return true;
 }
 
 Store::Stored Store::Put(std::string_view type, std::string_view key, int version, std::string_view text,
                          int64_t& number, Failure& failure) {
+    if (FBatchLost(failure)) return FAILED;
     Statement find(findM);
     const int result = find.Bind(type).Bind(key).Step();
     if (result != SQLITE_ROW && result != SQLITE_DONE) return Fail(failure), FAILED;
@@ -214,18 +226,27 @@ bool Store::Read(int64_t number, const std::function<void(std::string_view)>& ta
 }
 
 bool Store::Begin(Failure& failure) {
-    return Run("BEGIN IMMEDIATE") || Fail(failure);
+    if (FBatchLost(failure)) return false;
+    if (!Run("BEGIN IMMEDIATE")) return Fail(failure);
+    isBatchM = true;
+    return true;
 }
 
 bool Store::Commit(Failure& failure) {
-    if (Run("COMMIT")) return true;
-    Fail(failure);
+    if (!FBatchLost(failure)) {
+        if (Run("COMMIT")) {
+            isBatchM = false;
+            return true;
+        }
+        Fail(failure);
+    }
     Rollback();
     return false;
 }
 
 void Store::Rollback() {
     Run("ROLLBACK");
+    isBatchM = false;
 }
 
 }  // namespace sorn::service

@@ -44,7 +44,8 @@ class Store {
     /// Hands the text of a row to `take`, for the time of the call; false, too, without such a row.
     bool Read(int64_t number, const std::function<void(std::string_view)>& take, Failure& failure);
 
-    /// Operations up to Commit are done together or not at all. No batch in a batch.
+    /// Operations up to Commit are done together or not at all. No batch in a batch. A failure such as a full
+    /// disk may end the batch on its own: then every further operation of it fails likewise, Commit included.
     bool Begin(Failure& failure);
     bool Commit(Failure& failure);
     void Rollback();
@@ -67,6 +68,7 @@ class Store {
     bool Run(const char* sql);
     int64_t Number(const char* sql);
     bool Fail(Failure& failure);
+    bool FBatchLost(Failure& failure) const;
 
     std::unique_ptr<sqlite3, CloseDatabase> databaseM;
     Prepared findM;
@@ -75,6 +77,8 @@ class Store {
     Prepared removeM;
     Prepared listM;
     Prepared readM;
+    bool isBatchM = false;
+    Failure lossM;  // the last failure in the batch
 };
 
 }  // namespace sorn::service

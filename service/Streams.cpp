@@ -3,6 +3,7 @@
 #include <vector>
 
 #include "rox/RoxHashBytes.h"
+#include "rox/RoxMonotonicTime.h"
 #include "service/ListAnswer.h"
 
 namespace sorn::service {
@@ -105,15 +106,19 @@ void Streams::Unqueue(Group& group) {
 }
 
 bool Streams::Deliver() {
-    Turn turn;
+    Turn turn{RoxMonotonicTime::Now()};
     while (!queuedM.empty()) {
         if (!DeliverGroup(*queuedM.front(), turn)) return true;
     }
     return false;
 }
 
+/// Each turn does something.
 bool Streams::FOver(const Turn& turn) const {
-    return turn.nMessages >= limitsM.maxTurnMessages || turn.nBytes >= limitsM.maxTurnBytes;
+    if (turn.nMessages == 0) return false;
+    return turn.nMessages >= limitsM.maxTurnMessages || turn.nBytes >= limitsM.maxTurnBytes ||
+           RoxMonotonicTime::ToNanoseconds(RoxMonotonicTime::Now() - turn.start) >=
+               limitsM.maxTurnNanoseconds;
 }
 
 /// False when the turn is over before all streams of the group have their list.

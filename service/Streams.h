@@ -62,6 +62,7 @@ class Streams {
     };
     using Groups = std::map<std::string, Group>;  // by identity
     struct Turn {
+        int64_t start;         // in tocks
         size_t nMessages = 0;  // and lists that were written for them
         size_t nBytes = 0;
     };

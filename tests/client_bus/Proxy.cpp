@@ -24,13 +24,14 @@ int NewSocket() {
     return socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
 }
 
-// False at the end of either.
-bool Forward(int from, int to, size_t& nLeft, size_t& nDone) {
+// False at the end of either. Bytes are counted before they go on, so that who got them finds them counted.
+bool Forward(int from, int to, size_t& nLeft, std::atomic<size_t>& nCounted) {
     char some[4096];
     const ssize_t n = recv(from, some, sizeof some, 0);
     if (n <= 0) return false;
-    nDone = std::min(static_cast<size_t>(n), nLeft);
+    const size_t nDone = std::min(static_cast<size_t>(n), nLeft);
     nLeft -= nDone;
+    nCounted += nDone;
     return nDone == 0 || send(to, some, nDone, MSG_NOSIGNAL) == static_cast<ssize_t>(nDone);
 }
 
@@ -82,12 +83,11 @@ void Proxy::Run() {
 
 void Proxy::Pass(int client, int service, size_t nLeft, bool isStall) {
     size_t nUnlimited = SIZE_MAX;
+    std::atomic<size_t> nSent{0};
     bool fromClient = false;
     bool fromService = false;
     while ((nLeft > 0 || isStall) && Wait(client, service, fromClient, fromService)) {
-        size_t nDone = 0;
-        if (fromService && !Forward(service, client, nLeft, nDone)) return;
-        nPassed += nDone;
-        if (fromClient && !Forward(client, service, nUnlimited, nDone)) return;
+        if (fromService && !Forward(service, client, nLeft, nPassed)) return;
+        if (fromClient && !Forward(client, service, nUnlimited, nSent)) return;
     }
 }

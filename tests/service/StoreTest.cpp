@@ -178,6 +178,25 @@ TEST_F(StoreTest, RefusesWhatDoesNotFit) {
     EXPECT_EQ(store->Put("a", "2", 0, "small", number, failure), Store::INSERTED);
 }
 
+TEST_F(StoreTest, ABatchThatDoesNotFitIsNotStoredInPart) {
+    {
+        const auto store = Open(1 << 20);
+        Failure failure;
+        ASSERT_TRUE(store->Begin(failure));
+        EXPECT_NE(Put(*store, "a", "1", "one"), 0);
+        EXPECT_EQ(Put(*store, "a", "2", std::string(2'000'000, 'x')), 0);
+        EXPECT_EQ(Put(*store, "a", "3", "three"), 0) << "it would be stored on its own";
+        EXPECT_FALSE(store->Commit(failure));
+        EXPECT_EQ(failure.code, ErrorCode::resourceUnavailableG);
+        EXPECT_EQ(failure.text, "the store is full");
+        EXPECT_EQ(All(*store, "a"), "");
+        ASSERT_TRUE(store->Begin(failure)) << "the next batch is another one";
+        EXPECT_NE(Put(*store, "a", "4", "four"), 0);
+        EXPECT_TRUE(store->Commit(failure));
+    }
+    EXPECT_EQ(All(*Open(), "a"), "four;");
+}
+
 /// Stores records until it is killed and tells each that is done by a byte.
 [[noreturn]] void StoreForEver(const std::string& path, int told) {
     std::string words;
