@@ -1,5 +1,6 @@
 #include "service/Streams.h"
 
+#include <utility>
 #include <vector>
 
 #include "rox/RoxHashBytes.h"
@@ -123,6 +124,9 @@ bool Streams::FOver(const Turn& turn) const {
 
 /// False when the turn is over before all streams of the group have their list.
 bool Streams::DeliverGroup(Group& group, Turn& turn) {
+    // A list that was made is sent at least once, and the next one goes on where this one ended: however fast
+    // changes come, every stream gets its turn.
+    bool isDue = !group.isWritten;
     if (!group.isWritten) {
         if (FOver(turn)) return false;
         ++turn.nMessages;
@@ -133,12 +137,13 @@ bool Streams::DeliverGroup(Group& group, Turn& turn) {
         }
         turn.nBytes += group.text.size();
         group.digest = Digest(group.text);
-        group.next = {0, 0};
         group.isWritten = true;
     }
-    for (auto each = group.streams.lower_bound(group.next); each != group.streams.end(); ++each) {
+    auto each = group.streams.lower_bound(group.next);
+    for (size_t n = group.streams.size(); n > 0; --n, ++each) {
+        if (each == group.streams.end()) each = group.streams.begin();
         if (each->second == group.digest) continue;
-        if (FOver(turn)) {
+        if (!std::exchange(isDue, false) && FOver(turn)) {
             group.next = each->first;
             return false;
         }

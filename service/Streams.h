@@ -58,7 +58,7 @@ class Streams {
         bool isWritten = false;
         std::string text;
         uint64_t digest = 0;
-        StreamId next = {0, 0};
+        StreamId next = {0, 0};  // where the next turn goes on, all around
     };
     using Groups = std::map<std::string, Group>;  // by identity
     struct Turn {

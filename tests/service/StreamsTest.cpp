@@ -263,17 +263,35 @@ TEST_F(StreamsTest, ATurnThatTakesLongEndsButDoesSomething) {
     }
     Take();
     PutRecording(1);
-    // A list in one turn, its message in the next or with it: never two lists in one.
-    unsigned nTurns = 1;
-    size_t nMessages = 0;
-    while (Service().Deliver()) {
-        const size_t n = Take().size();
-        EXPECT_LE(n, 1u);
-        nMessages += n;
-        ASSERT_LT(++nTurns, 100u);
+    for (uint32_t n = 1; n <= nStreams; ++n) {
+        EXPECT_EQ(Service().Deliver(), n < nStreams);
+        EXPECT_EQ(Take().size(), 1u);
     }
-    EXPECT_EQ(nMessages + Take().size(), nStreams);
-    EXPECT_GE(nTurns, nStreams);
+}
+
+TEST_F(StreamsTest, EveryStreamHasItsTurnHoweverFastChangesCome) {
+    struct Row {
+        const char* what;
+        size_t maxTurnMessages;
+        size_t maxTurnBytes;
+        int64_t maxTurnNanoseconds;
+    };
+    for (const Row& row : {Row{"messages", 1, SIZE_MAX, INT64_MAX}, Row{"bytes", SIZE_MAX, 1, INT64_MAX},
+                           Row{"time", SIZE_MAX, SIZE_MAX, 0}}) {
+        limits.maxTurnMessages = row.maxTurnMessages;
+        limits.maxTurnBytes = row.maxTurnBytes;
+        limits.maxTurnNanoseconds = row.maxTurnNanoseconds;
+        Start();
+        for (uint32_t rpcId = 1; rpcId <= 3; ++rpcId) Open(rpcId);
+        Take();
+        std::string rpcIds;
+        for (int i = 0; i < 6; ++i) {
+            PutRecording(i);
+            EXPECT_TRUE(Service().Deliver());
+            for (const Sent& each : Take()) rpcIds += std::to_string(each.response.rpcId) + " ";
+        }
+        EXPECT_EQ(rpcIds, "1 2 3 1 2 3 ") << row.what;
+    }
 }
 
 TEST_F(StreamsTest, ThereAndBackAgainIsNoChange) {
