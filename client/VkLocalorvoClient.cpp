@@ -86,8 +86,18 @@ void VkLocalorvoClient::Destroy() {
         std::swap(client, singletonG);
     }
     if (client == nullptr) return;
-    client->Disconnect();
+    client->End();
     RoxCore::DownRef(client);
+}
+
+void VkLocalorvoClient::End() {
+    {
+        RoxSpinLockHold hold(tablesLockM);
+        isEndedM = true;
+    }
+    Disconnect();
+    // A sender that handled events itself may be in a callback still.
+    if (!DeliveryOfThread::FInside()) RoxMutexHold hold(clientMutexM);
 }
 
 ref<VkLocalorvoClient> VkLocalorvoClient::Get() {
@@ -124,14 +134,22 @@ bool VkLocalorvoClient::FConnected() {
     return handles.connection != 0 && handles.session != 0;
 }
 
+bool VkLocalorvoClient::FEnded() {
+    RoxSpinLockHold hold(tablesLockM);
+    return isEndedM;
+}
+
 bool VkLocalorvoClient::Connect() {
     Semaphores semaphores;
     {
         Lifecycle lifecycle(*this);
         if (lifecycle.FNested()) return false;
-        if (FConnected() || TryConnect()) return true;
+        if (FConnected()) return true;
+        if (FEnded()) return false;
+        const int64_t start = RoxMonotonicTime::Now();
+        if (TryConnect()) return true;
         semaphores = StopMonitoring();
-        CancelPending(1);
+        CancelPending(1, start);
         Close();
     }
     AwaitEnd(semaphores);
@@ -162,7 +180,7 @@ void VkLocalorvoClient::Disconnect() {
         AwaitEnd(StopMonitoring());
         Lifecycle lifecycle(*this);
         if (FMonitored()) continue;  // again, by another thread
-        CancelPending(0);
+        CancelPending(0, RoxMonotonicTime::Now());
         Close();
         return;
     }
@@ -171,8 +189,8 @@ void VkLocalorvoClient::Disconnect() {
 /// Sends a cancel for every request that is pending now, whatever comes of it, and removes the request.
 /// Without a connection each makes attempts to get one, which would again cancel all that is pending if they
 /// fail; so all of that is one loop, which gives up after maxConnectAttemptsG attempts in a row, nAttempts of
-/// them made before, and when teardownLimitG has passed.
-void VkLocalorvoClient::CancelPending(unsigned nAttempts) {
+/// them made before, and when teardownLimitG has passed since `start`.
+void VkLocalorvoClient::CancelPending(unsigned nAttempts, int64_t start) {
     RoxWorkStack<uint32_t, 16> pending(GetMempool());
     {
         RoxSpinLockHold hold(tablesLockM);
@@ -180,12 +198,11 @@ void VkLocalorvoClient::CancelPending(unsigned nAttempts) {
             pending.Push(requestTableM.KeyOf(iter));
         }
     }
-    const int64_t start = RoxMonotonicTime::Now();
     const auto isLate = [start] {
         return RoxMonotonicTime::ToNanoseconds(RoxMonotonicTime::Now() - start) >= teardownLimitG;
     };
-    for (; !pending.FEmpty() && !isLate(); pending.Pop()) {
-        const uint32_t rpcId = pending.Top();
+    for (size_t i = 0; i < pending.Size() && !isLate(); ++i) {
+        const uint32_t rpcId = pending[i];
         if (FindRequest(rpcId) == nullptr) continue;  // it has ended by itself
         while (!FConnected()) {
             if (nAttempts == maxConnectAttemptsG || isLate()) return;
@@ -198,19 +215,25 @@ void VkLocalorvoClient::CancelPending(unsigned nAttempts) {
     }
 }
 
+/// What the tables held dies when the lock is no longer held.
 void VkLocalorvoClient::ClearTables() {
-    const auto clear = [this](auto& table) {
-        for (;;) {
-            RoxSpinLockHold hold(tablesLockM);
-            _RoxHashTableIter iter(table);
-            if (!iter.FCurrent()) return;
-            iter.RemoveCurrent();
-        }
-    };
-    clear(requestTableM);
-    clear(responseTableM);
-    clear(callbackTableM);
-    clear(contextTableM);
+    RoxWorkStack<RoxCore*, 16> dying(GetMempool());
+    {
+        RoxSpinLockHold hold(tablesLockM);
+        const auto keep = [&dying](auto& table) {
+            for (_RoxHashTableIter iter(table); iter.FCurrent(); iter.Next()) {
+                auto* const value = table.ValueOf(iter).get();
+                value->UpRef();
+                dying.Push(value);
+            }
+            table.Clear();
+        };
+        keep(requestTableM);
+        keep(responseTableM);
+        callbackTableM.Clear();
+        contextTableM.Clear();
+    }
+    for (; !dying.FEmpty(); dying.Pop()) RoxCore::DownRef(dying.Top());
 }
 
 /// Forgets the handles before it clears the tables: what a sender stores afterwards is not sent on them.

@@ -41,9 +41,10 @@ class VkLocalorvoClient : public RoxCore {
     /// Makes the client in the pool, which must outlive it, unless there is one. Always 0.
     static unsigned Create(RoxMempool* pool);
     /// Ends the table of shared names (DestroyGlobalSornHashTable) in any case, and the client if there is
-    /// one: cancels what is pending and disconnects. No callback runs afterwards, but one that this is called
-    /// from, or that has ended the connection itself, goes on, and so does its thread: the pool must outlive
-    /// that, too, which the stop of the activities' module (RoxInitInfo::StopAll) waits for.
+    /// one: cancels what is pending and disconnects. The object sends nothing any more for whoever still
+    /// holds it. No callback runs afterwards, but one that this is called from, or that has ended the
+    /// connection itself, goes on, and so does its thread: the pool must outlive that, too, which the stop of
+    /// the activities' module (RoxInitInfo::StopAll) waits for.
     static void Destroy();
     /// The client; null before Create. Connects if it is not connected; whether that worked does not show.
     static ref<VkLocalorvoClient> Get();
@@ -78,7 +79,8 @@ class VkLocalorvoClient : public RoxCore {
     /// A new query for a pending request; false, too, when none has that number. States no version.
     bool SendUpdateRequest(unsigned int rpcId, sorn::SornObject* object);
     /// Ends a pending request that has many responses; false, and nothing is sent, for any other. The
-    /// callback is not called for what comes later, whether the send worked or not.
+    /// callback is not called for what comes later, whether the send worked or not; but another thread that
+    /// has a response in hand already may still call it.
     bool CancelRequest(unsigned int rpcId);
     /// Whether a response of that number would still find its request. The way to see that a lost connection
     /// has ended an exchange.
@@ -112,6 +114,8 @@ class VkLocalorvoClient : public RoxCore {
         ref<RoxCoreSemaphore> stopped;
         ref<RoxCoreSemaphore> started;
     };
+    /// What came of a message: the bus has it, it was not to be sent, or the bus failed.
+    enum Sent { DONE, REFUSED, FAILED };
     struct Handles {
         uint32_t connection;
         uint32_t session;
@@ -121,10 +125,11 @@ class VkLocalorvoClient : public RoxCore {
     VkLocalorvoClient();
 
     // Lifecycle.
+    void End();
     bool Connect();
     void Disconnect();
     bool TryConnect();
-    void CancelPending(unsigned nAttempts);
+    void CancelPending(unsigned nAttempts, int64_t start);
     void ClearTables();
     void Close();
     void StartMonitoring();
@@ -133,6 +138,7 @@ class VkLocalorvoClient : public RoxCore {
     bool FMonitored();
     Handles GetHandles();
     bool FConnected();
+    bool FEnded();
     void SetHandles(uint32_t connection, uint32_t session);
 
     static void Observe(bool isSent, const void* bytes, unsigned nBytes);
@@ -142,7 +148,7 @@ class VkLocalorvoClient : public RoxCore {
     static sorn::OrvoVersion PickVersion();
     bool SendWrapper(const ref<sorn::OrvoRpcWrapper>& wrapper);
     bool SendPending(const ref<sorn::RequestWrapper>& request, void* callback, void* context);
-    bool Transmit(const ref<sorn::OrvoRpcWrapper>& wrapper, uint32_t session);
+    Sent Transmit(const ref<sorn::OrvoRpcWrapper>& wrapper, uint32_t session);
     void HandleLoss();
     bool BeginPump();
     void EndPump();
@@ -174,6 +180,7 @@ class VkLocalorvoClient : public RoxCore {
     Semaphores semaphoresM;
     RoxMutex clientMutexM;  // of the receiving side: held while a callback runs
     std::atomic<bool> ignoreAllM{false};
+    bool isEndedM = false;          // by Destroy: connects no more
     bool isPumpedM = false;         // a sender handles events, and nobody else
     bool isMonitoringDueM = false;  // as soon as it has done so
 

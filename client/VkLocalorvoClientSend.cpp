@@ -41,35 +41,36 @@ sorn::OrvoVersion VkLocalorvoClient::PickVersion() {
 bool VkLocalorvoClient::SendWrapper(const ref<OrvoRpcWrapper>& wrapper) {
     if (!FConnected() && !Connect()) return false;
     if (ignoreAllM) return false;
-    if (Transmit(wrapper, GetHandles().session)) return true;
-    HandleLoss();
-    return false;
+    const Sent sent = Transmit(wrapper, GetHandles().session);
+    if (sent == FAILED) HandleLoss();
+    return sent == DONE;
 }
 
 /// The same for a request that is pending from before the send, since the response may be there before that
 /// returns. Again when the connection stands: a loss on another thread may have ended it meanwhile.
 bool VkLocalorvoClient::SendPending(const ref<RequestWrapper>& request, void* callback, void* context) {
     StoreRequest(request, callback, context);
-    if ((FConnected() || Connect()) && !ignoreAllM &&
-        Transmit(request, StoreRequest(request, callback, context))) {
-        return true;
+    Sent sent = REFUSED;
+    if ((FConnected() || Connect()) && !ignoreAllM) {
+        sent = Transmit(request, StoreRequest(request, callback, context));
     }
+    if (sent == DONE) return true;
     RemoveRequest(request->GetRpcId());
-    HandleLoss();
+    if (sent == FAILED) HandleLoss();
     return false;
 }
 
-bool VkLocalorvoClient::Transmit(const ref<OrvoRpcWrapper>& wrapper, uint32_t session) {
+VkLocalorvoClient::Sent VkLocalorvoClient::Transmit(const ref<OrvoRpcWrapper>& wrapper, uint32_t session) {
     sorn::ByteBuffer text(GetMempool());
     RoxString error;
-    if (!sorn::OrvoRpcV2::MarshalToString(wrapper, text, error, GetMempool(), false)) return false;
+    if (!sorn::OrvoRpcV2::MarshalToString(wrapper, text, error, GetMempool(), false)) return REFUSED;
     Observe(true, text.GetData(), text.GetLength());
     const VkAesRequest record = {{text.GetLength(), text.GetData()}};
-    return VkBusMarshalAndSend(session, VkAesRequest::idG, &record) == 0;
+    return VkBusMarshalAndSend(session, VkAesRequest::idG, &record) == 0 ? DONE : FAILED;
 }
 
-/// After a send that failed: handles what is there, up to the news that the connection is lost, unless
-/// somebody else handles events. One who only sends would never hear of it, and never connect again.
+/// After a send that the bus failed: handles what is there, up to the news that the connection is lost,
+/// unless somebody else handles events. One who only sends would never hear of it, and never connect again.
 void VkLocalorvoClient::HandleLoss() {
     if (DeliveryOfThread::FInside() || !FConnected() || !BeginPump()) return;
     constexpr int64_t atOnce = 0;

@@ -23,6 +23,7 @@ class BusSession {
 
     /// Connects to the address that VkBusSetAddress has set; false and words.
     bool Open(std::string& words);
+    bool FOpen() const { return sessionM != 0; }
     /// Sends a message and waits for the response with its number, 5 seconds at most; null and words.
     ref<ResponseWrapper> Exchange(const ref<OrvoRpcWrapper>& message, std::string& words);
 

@@ -52,8 +52,8 @@ bool TellAll(const PutAndRemoveOptions& options, LineReader& reader) {
     }
     bool isAllDone = true;
     std::string line;
-    for (uint32_t number = 1; reader.ReadLine(line); ++number) {
-        if (line.empty()) continue;
+    for (uint32_t number = 1; session.FOpen() && reader.ReadLine(line); ++number) {
+        if (line.find_first_not_of(" \t\r") == std::string::npos) continue;
         if (Tell(session, &sessionPool, number, options.action, line, words)) continue;
         isAllDone = false;
         std::fprintf(stderr, "line %u: %s\n", number, words.c_str());

@@ -94,7 +94,7 @@ int VkBusGetSelectFd(uint32_t connection);
 unsigned VkBusProcessOneEvent(uint32_t connection, const int64_t* limitNanoseconds);
 
 /// Closes the session; what the other end's kernel has not taken yet is dropped. No callback begins
-/// afterwards; one that has begun on another thread may still run.
+/// afterwards, but for an event that another thread has taken out already.
 unsigned VkBusCloseSession(uint32_t session);
 /// Closes the connection, or stops listening, and closes its sessions in the same way.
 unsigned VkBusCloseConnection(uint32_t connection);

@@ -79,10 +79,50 @@ TEST_F(TeardownTest, WhileOthersSend) {
                 }
             }
         });
-        // A thread that held the client may have connected it again.
-        RoxInitInfo::StopAll();
-        EXPECT_EQ(0u, RoxInitInfo::StartAll(&pool));
+        // Nor did a thread that held the client connect it again: see the threads left at the end of the
+        // test.
     }
+}
+
+TEST_F(TeardownTest, WhoStillHoldsTheClientConnectsNoMore) {
+    Service service;
+    const ref<VkLocalorvoClient> client = VkLocalorvoClient::Get();
+    EXPECT_TRUE(WaitUntil([&] { return service.nHellos == 1; }));
+    const size_t nDescriptors = CountInProc("fd");
+    VkLocalorvoClient::Destroy();
+    Answers answers;
+    unsigned rpcId = 0;
+    EXPECT_FALSE(SendAsync(client, true, answers, rpcId));
+    EXPECT_FALSE(FAnswered(client));
+    EXPECT_FALSE(client->SendRequestAndForget(Object().get()));
+    EXPECT_FALSE(client->FPending(1));
+    EXPECT_GT(nDescriptors, CountInProc("fd"));
+    EXPECT_EQ(1u, service.nHellos);
+}
+
+TEST_F(TeardownTest, WaitsForACallbackOfASenderThatHandlesEvents) {
+    // The synchronous sender is asked first and answered last, so that the callback runs on its thread.
+    std::atomic<unsigned> nAsked{0};
+    Service service([&](const Request& request) {
+        if (++nAsked == 2) Service::Respond(request, true, request.body);
+    });
+    const ref<VkLocalorvoClient> client = VkLocalorvoClient::Get();
+    std::thread waiter([&] { EXPECT_FALSE(FAnswered(client)); });
+    EXPECT_TRUE(WaitUntil([&] { return nAsked == 1; }));
+    Answers answers;
+    std::atomic<bool> isInside{false};
+    std::atomic<bool> isDone{false};
+    answers.then = [&](unsigned, bool) {
+        isInside = true;
+        std::this_thread::sleep_for(std::chrono::milliseconds(200));
+        isDone = true;
+    };
+    unsigned rpcId = 0;
+    EXPECT_TRUE(SendAsync(client, false, answers, rpcId));
+    EXPECT_TRUE(WaitUntil([&] { return isInside.load(); }));
+    VkLocalorvoClient::Destroy();
+    EXPECT_TRUE(isDone);
+    waiter.join();
 }
 
 TEST_F(TeardownTest, TwiceAndByTheRuntime) {
