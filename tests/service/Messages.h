@@ -48,7 +48,8 @@ struct ResponseText {
         const size_t line = message.find("\r\n") + 2;
         const auto nHeaders = static_cast<size_t>(std::atol(message.c_str() + 7));
         const std::string headers = "\r\n" + message.substr(line, nHeaders);
-        rpcId = static_cast<uint32_t>(std::atol(headers.c_str() + headers.find("\r\nRpcId: ") + 9));
+        rpcId = static_cast<uint32_t>(
+            std::strtoul(headers.c_str() + headers.find("\r\nRpcId: ") + 9, nullptr, 10));
         isFinal = headers.find("\r\nIsFinal: true\r\n") != std::string::npos;
         body = message.substr(line + nHeaders);
     }
