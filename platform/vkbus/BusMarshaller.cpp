@@ -30,21 +30,9 @@ bool BusMarshaller::AddUnsigned(uint32_t value) {
 
 bool BusMarshaller::AddMembers(const BusStructDescriptor& descriptor, const unsigned char* record,
                                unsigned depth) {
-    size_t offset = 0;
-    for (uint32_t i = 0; i < descriptor.nMembers; ++i) {
-        BusTypeWords words(descriptor.vMember[i]);
-        BusTypeWords again = words;
-        BusLayout layout;
-        if (!shapeM.LayoutOf(again, depth, layout)) {
-            return false;
-        }
-        offset = BusLayout::Align(offset, layout.align);
-        if (!AddValue(words, record + offset, depth)) {
-            return false;
-        }
-        offset += layout.size;
-    }
-    return true;
+    return shapeM.WalkMembers(descriptor, depth, [=, this](BusTypeWords& words, size_t offset) {
+        return AddValue(words, record + offset, depth);
+    });
 }
 
 bool BusMarshaller::AddValue(BusTypeWords& words, const unsigned char* at, unsigned depth) {

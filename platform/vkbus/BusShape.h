@@ -82,6 +82,27 @@ class BusShape {
     bool LayoutOf(BusTypeWords& words, unsigned depth, BusLayout& layout) const;
     bool LayoutOfStruct(const BusStructDescriptor& descriptor, unsigned depth, BusLayout& layout) const;
 
+    /// Calls `member(words of its type, its offset in memory)` for each member in order, until one gives
+    /// false.
+    template <class Member>
+    bool WalkMembers(const BusStructDescriptor& descriptor, unsigned depth, Member member) const {
+        size_t offset = 0;
+        for (uint32_t i = 0; i < descriptor.nMembers; ++i) {
+            BusTypeWords words(descriptor.vMember[i]);
+            BusTypeWords again = words;
+            BusLayout layout;
+            if (!LayoutOf(again, depth, layout)) {
+                return false;
+            }
+            offset = BusLayout::Align(offset, layout.align);
+            if (!member(words, offset)) {
+                return false;
+            }
+            offset += layout.size;
+        }
+        return true;
+    }
+
     /// Adds the signature of a type.
     bool Sign(BusTypeWords& words, unsigned depth, BusSignature& signature) const;
     /// Adds that of a structure as a value.

@@ -39,21 +39,9 @@ void* BusUnmarshaller::MakeRecord(const BusStructDescriptor& descriptor, unsigne
 
 bool BusUnmarshaller::ReadMembers(const BusStructDescriptor& descriptor, unsigned char* record,
                                   unsigned depth) {
-    size_t offset = 0;
-    for (uint32_t i = 0; i < descriptor.nMembers; ++i) {
-        BusTypeWords words(descriptor.vMember[i]);
-        BusTypeWords again = words;
-        BusLayout layout;
-        if (!shapeM.LayoutOf(again, depth, layout)) {
-            return false;
-        }
-        offset = BusLayout::Align(offset, layout.align);
-        if (!ReadValue(words, record + offset, depth)) {
-            return false;
-        }
-        offset += layout.size;
-    }
-    return true;
+    return shapeM.WalkMembers(descriptor, depth, [=, this](BusTypeWords& words, size_t offset) {
+        return ReadValue(words, record + offset, depth);
+    });
 }
 
 bool BusUnmarshaller::ReadValue(BusTypeWords& words, unsigned char* at, unsigned depth) {
