@@ -59,7 +59,7 @@ ref<BusSession> BusEndpoint::Add(BusFd socket, const BusSessionTerms& terms, con
 unsigned BusEndpoint::ProcessOneEvent(const int64_t* limit) {
     const BusDeadline deadline(limit != nullptr ? *limit : 0);
     for (;;) {
-        const bool handled = Serve(pollerM.Wait(deadline.Milliseconds()));
+        const bool handled = Serve(pollerM.Wait(deadline));
         {
             RoxMutexHold hold(mutexM);
             if (fOverM && attentionM.empty()) {

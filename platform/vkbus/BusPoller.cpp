@@ -5,6 +5,7 @@
 #include <sys/timerfd.h>
 
 #include "rox/RoxAssert.h"
+#include "rox/RoxMonotonicTime.h"
 
 bool BusPoller::Open() {
     epollM = BusFd(epoll_create1(EPOLL_CLOEXEC));
@@ -59,8 +60,26 @@ bool BusPoller::SetTimer(int64_t nanoseconds) {
     return timerfd_settime(timerM.Get(), 0, &when, nullptr) == 0;
 }
 
-uint64_t BusPoller::Wait(int milliseconds) {
+uint64_t BusPoller::Look(int milliseconds) {
     epoll_event event;
     // A signal counts as nothing: the caller looks at its time and comes again.
     return epoll_wait(epollM.Get(), &event, 1, milliseconds) == 1 ? event.data.u64 : nothingG;
+}
+
+uint64_t BusPoller::Wait(const BusDeadline& deadline) {
+    if (deadline.FPassed()) {
+        return Look(0);
+    }
+    const int64_t start = RoxMonotonicTime::Now();
+    const auto elapsed = [start] { return RoxMonotonicTime::ToNanoseconds(RoxMonotonicTime::Now() - start); };
+    const bool looks = patienceM.FLook();
+    uint64_t tag = nothingG;
+    while (looks && tag == nothingG && elapsed() < BusPatience::lookG) {
+        tag = Look(0);
+    }
+    if (tag == nothingG) {
+        tag = Look(deadline.Milliseconds());
+    }
+    patienceM.Note(looks, tag != nothingG ? elapsed() : INT64_MAX);
+    return tag;
 }

@@ -2,7 +2,9 @@
 
 #include <cstdint>
 
+#include "vkbus/BusDeadline.h"
 #include "vkbus/BusFd.h"
+#include "vkbus/BusPatience.h"
 
 /// The one descriptor that a connection or a listener hands out: an epoll descriptor over its sockets, a
 /// timer and an event counter for what the sockets do not show. What is registered changes while other
@@ -31,12 +33,15 @@ class BusPoller {
     /// descriptors.
     bool SetTimer(int64_t nanoseconds);
 
-    /// What is ready, one at a time and each in turn; waits for up to so many milliseconds.
-    uint64_t Wait(int milliseconds);
+    /// What is ready, one at a time and each in turn; waits for it, in whole milliseconds.
+    uint64_t Wait(const BusDeadline& deadline);
 
  private:
+    uint64_t Look(int milliseconds);
+
     BusFd epollM;
     BusFd wakeM;
     BusFd timerM;
     bool fWokenM = false;
+    BusPatience patienceM;
 };
