@@ -36,6 +36,11 @@ std::string Marshalled(const ref<OrvoRpcWrapper>& message, RoxMempool* pool) {
           "a message that was read is too large to be written");
     const std::string bytes(reinterpret_cast<const char*>(out.GetData()), out.GetLength());
     Check(OrvoRpcV2::MarshalToString(pool, message, false).View() == bytes, "the string's bytes differ");
+    unsigned begin = 0;
+    sorn::ByteBuffer inPlace(pool);
+    Check(OrvoRpcV2::MarshalInPlace(message, inPlace, begin, error, pool) &&
+              inPlace.ToRoxString(pool).View().substr(begin) == bytes,
+          "the bytes in place differ");
     return bytes;
 }
 
@@ -98,6 +103,11 @@ int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const RoxString text = RoxString::FromUtf8Bytes(nullptr, static_cast<unsigned>(size), data);
     RoxString words;
     const ref<OrvoRpcWrapper> message = OrvoRpcV2::UnmarshalFromString(pool.Get(), text, false, words);
+    RoxString bytesWords;
+    const ref<OrvoRpcWrapper> ofBytes = OrvoRpcV2::UnmarshalFromBytes(
+        pool.Get(), rox::ByteBuffer::New(pool.Get(), data, static_cast<uint32_t>(size)), false, bytesWords);
+    Check((ofBytes == nullptr) == (message == nullptr) && bytesWords == words,
+          "bytes are read otherwise than text");
     RoxString parsedWords;
     const ref<OrvoRpcWrapper> parsed = OrvoRpcV2::UnmarshalFromString(pool.Get(), text, true, parsedWords);
     const bool isShort = size <= 25 && text.View().find("\r\n") == std::string_view::npos;

@@ -51,6 +51,10 @@ std::string FramingFixture::Str(const rox::ByteBuffer& bytes) {
     return std::string(reinterpret_cast<const char*>(bytes.GetData()), bytes.GetLength());
 }
 
+ref<rox::ByteBuffer> FramingFixture::Bytes(const std::string& text) {
+    return rox::ByteBuffer::New(&pool, text.data(), static_cast<uint32_t>(text.size()));
+}
+
 ref<Dict> FramingFixture::DictOf(const ModelHeaders& headers) {
     ref<Dict> dict = MakeDict(&pool);
     for (const auto& [name, vValues] : headers) {
@@ -108,7 +112,14 @@ std::string FramingFixture::Written(const ref<OrvoRpcWrapper>& wrapper, const ch
     RoxString error(wordsBefore);
     const bool isWritten = OrvoRpcV2::MarshalToString(wrapper, out, error, &pool, false);
     const std::string bytes(reinterpret_cast<const char*>(out.GetData()), out.GetLength());
+    ByteBuffer inPlace(&pool);
+    inPlace.AppendString("what was there before");
+    unsigned begin = 0;
+    RoxString errorInPlace(wordsBefore);
+    EXPECT_EQ(OrvoRpcV2::MarshalInPlace(wrapper, inPlace, begin, errorInPlace, &pool), isWritten);
+    EXPECT_EQ(Str(errorInPlace), Str(error));
     if (isWritten) {
+        EXPECT_EQ(Str(inPlace.ToRoxString(&pool)).substr(begin), bytes);
         EXPECT_EQ(Str(error), wordsBefore);
         return bytes;
     }
@@ -120,8 +131,14 @@ std::string FramingFixture::ByLibrary(const std::string& input, bool isBodyParse
     RoxString error(wordsBefore);
     const RoxString text = Text(input);
     const ref<OrvoRpcWrapper> wrapper = OrvoRpcV2::UnmarshalFromString(&pool, text, isBodyParsed, error);
+    RoxString errorOfBytes(wordsBefore);
+    const ref<OrvoRpcWrapper> ofBytes =
+        OrvoRpcV2::UnmarshalFromBytes(&pool, Bytes(input), isBodyParsed, errorOfBytes);
+    EXPECT_EQ(Str(errorOfBytes), Str(error));
+    EXPECT_EQ(ofBytes == nullptr, wrapper == nullptr);
     if (wrapper == nullptr) return "refused: " + Str(error);
     EXPECT_EQ(Str(error), wordsBefore);
+    EXPECT_EQ(Look(*ofBytes).Describe(), Look(*wrapper).Describe());
     return "read: " + Look(*wrapper).Describe();
 }
 

@@ -28,6 +28,7 @@ class FramingFixture : public testing::Test {
     }
     static std::string Str(const RoxString& text) { return std::string(text.View()); }
     static std::string Str(const rox::ByteBuffer& bytes);
+    ref<rox::ByteBuffer> Bytes(const std::string& text);
 
     ref<sorn::Dict> DictOf(const ModelHeaders& headers);
     /// A body of JSON text; null for no text.
@@ -37,11 +38,11 @@ class FramingFixture : public testing::Test {
     /// What a message of the library says; its body as the text that it keeps, or as compact text.
     static ModelMessage Look(sorn::OrvoRpcWrapper& wrapper);
 
-    /// The message by the first of the marshalling operations, or its words.
+    /// The message by those marshalling operations that fill a byte buffer, or its words.
     std::string Written(const ref<sorn::OrvoRpcWrapper>& wrapper, const char* wordsBefore = "");
 
-    // What reading gives: the message on lines with "read: " in front, or "refused: " and the string for the
-    // words as it is then.
+    // What reading a text, and its bytes in a buffer, gives: the message on lines with "read: " in front, or
+    // "refused: " and the string for the words as it is then.
     std::string ByLibrary(const std::string& input, bool isBodyParsed = false, const char* wordsBefore = "");
     std::string ByModel(const std::string& input, bool isBodyParsed = false, const char* wordsBefore = "");
 

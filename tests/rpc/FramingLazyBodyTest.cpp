@@ -12,6 +12,7 @@
 #include "sorn/rpc/RequestUpdateWrapper.h"
 #include "sorn/rpc/RequestWrapper.h"
 #include "sorn/rpc/ResponseWrapper.h"
+#include "sornschema/Error.h"
 
 namespace sorntest {
 
@@ -125,6 +126,15 @@ TEST_F(FramingLazyBodyTest, MarshallingTakesOneCopyInTheMessage) {
         EXPECT_EQ(out.GetLength(), bigG + sizeof("ORPC/2 75 2097152\r\n") - 1 + 75);
     }
     {
+        RoxMempool fresh("in place");
+        ByteBuffer out(&pool);
+        out.Reserve(bigG + smallG);
+        unsigned begin = 0;
+        EXPECT_LT(Peak(fresh, [&] { OrvoRpcV2::MarshalInPlace(wrapper, out, begin, error, &fresh); }),
+                  smallG);
+        EXPECT_EQ(out.GetLength() - begin, bigG + sizeof("ORPC/2 75 2097152\r\n") - 1 + 75);
+    }
+    {
         RoxMempool fresh("sink");
         AddressSink sink;
         EXPECT_LT(Peak(fresh, [&] { OrvoRpcV2::MarshalToBytesink(wrapper, sink, error, &fresh, false); }),
@@ -178,6 +188,50 @@ TEST_F(FramingLazyBodyTest, UnmarshallingSharesTheText) {
             wrapper = nullptr;
             EXPECT_EQ(fresh.GetUsedBytes(), 0u);
         }
+    }
+}
+
+/// A body that is an object is written into the message, and nowhere else.
+TEST_F(FramingLazyBodyTest, MarshallingInPlaceWritesAnObjectOnce) {
+    const ref<SornObject> object = sornschema::Error::Factory(&pool);
+    static_cast<sornschema::Error&>(*object).text = Text(std::string(bigG, 'x'));
+    const ref<OrvoRpcWrapper> wrapper = ResponseWrapper::New(&pool, 7, true, object, OrvoVersion(), nullptr);
+    RoxMempool fresh("scratch");
+    ByteBuffer out(&pool);
+    out.Reserve(bigG + smallG);
+    const unsigned char* const place = out.GetData();
+    const size_t before = pool.GetUsedBytes();
+    unsigned begin = 0;
+    RoxString error;
+    EXPECT_LT(
+        Peak(fresh, [&] { EXPECT_TRUE(OrvoRpcV2::MarshalInPlace(wrapper, out, begin, error, &fresh)); }),
+        smallG);
+    EXPECT_EQ(out.GetData(), place);
+    EXPECT_EQ(pool.GetUsedBytes(), before);
+    EXPECT_TRUE(Str(out.ToRoxString(&pool)).substr(begin) == Written(wrapper));
+}
+
+/// The body's bytes are those of the buffer, which it holds, and with it whatever that keeps.
+TEST_F(FramingLazyBodyTest, UnmarshallingSharesTheBytes) {
+    const std::string body = Broken(bigG);
+    const std::string input = Framed({"RpcId: 7", "Type: response"}, body);
+    const ref<rox::ByteBuffer> storage = Bytes(input);
+    for (const bool isKept : {false, true}) {
+        ref<rox::ByteBuffer> bytes =
+            isKept ? rox::ByteBuffer::NewKept(&pool, storage, storage->GetData(), storage->GetLength())
+                   : Bytes(input);
+        const unsigned char* const place = bytes->GetData() + (input.size() - body.size());
+        RoxMempool fresh("message");
+        ref<OrvoRpcWrapper> wrapper;
+        RoxString error;
+        EXPECT_LT(Peak(fresh, [&] { wrapper = OrvoRpcV2::UnmarshalFromBytes(&fresh, bytes, false, error); }),
+                  smallG);
+        ASSERT_NE(wrapper, nullptr);
+        EXPECT_EQ(BytesOf(wrapper).GetData(), place);
+        bytes = nullptr;
+        EXPECT_TRUE(Str(BytesOf(wrapper)) == body);
+        wrapper = nullptr;
+        EXPECT_EQ(fresh.GetUsedBytes(), 0u);
     }
 }
 

@@ -24,7 +24,7 @@ constexpr char headersG[] =
 
 class MarshalLimitsTest : public FramingFixture {
  protected:
-    /// By all three forms: the message, or the words behind an "x" with all outputs as they were.
+    /// By all forms: the message, or the words behind an "x" with all outputs as they were.
     void Check(const ref<OrvoRpcWrapper>& wrapper, const std::string& expected, const char* words) {
         ByteBuffer out(&pool);
         out.AppendString("there");
@@ -34,6 +34,7 @@ class MarshalLimitsTest : public FramingFixture {
         const bool isGood = *words == '\0';
         EXPECT_EQ(OrvoRpcV2::MarshalToString(wrapper, out, error, &pool, false), isGood);
         EXPECT_EQ(OrvoRpcV2::MarshalToString(wrapper, text, textError, &pool, false), isGood);
+        EXPECT_TRUE(Written(wrapper, "x") == (isGood ? expected : Str(error)));
         const std::string wordsAfter = std::string("x") + words;
         EXPECT_EQ(Str(error), wordsAfter);
         EXPECT_EQ(Str(textError), wordsAfter);

@@ -37,6 +37,9 @@ class ByteBuffer {
     unsigned char* Reserve(unsigned n) { return bytesM.Reserve(n); }
     void Commit(unsigned n) { bytesM.Commit(n); }
 
+    /// Replaces n bytes from `offset` on, all of which must be there.
+    void Overwrite(unsigned offset, const void* bytes, unsigned n) { bytesM.Overwrite(offset, bytes, n); }
+
     /// Drops all bytes from `length` on, which must not be above the length; the capacity stays.
     void Truncate(unsigned length) { bytesM.Truncate(length); }
     void Clear() { bytesM.Truncate(0); }

@@ -41,6 +41,8 @@ class Rox1ByteBuffer {
         return storageM->MutableBytes() + lengthM;
     }
     void Commit(unsigned n) { lengthM += n; }
+    /// Replaces n bytes from `offset` on, which must be there.
+    void Overwrite(unsigned offset, const void* bytes, unsigned n) { storageM->SetBytes(offset, n, bytes); }
     /// Drops all bytes from `length` on; it must not be above the length. The capacity stays.
     void Truncate(unsigned length) { lengthM = length; }
 

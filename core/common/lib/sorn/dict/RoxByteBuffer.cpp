@@ -33,17 +33,18 @@ void SizedObjectArray<1, RoxMempool>::Borrow(unsigned char* data, uint32_t n) {
 
 namespace {
 
-/// Bytes of a text, which it holds.
-class TextByteBuffer final : public ByteBuffer {
+/// Bytes of something that it holds.
+template <class Keeper>
+class KeptByteBuffer final : public ByteBuffer {
  public:
-    TextByteBuffer(RoxMempool* pool, const RoxString& text, uint32_t offset, uint32_t n)
-        : ByteBuffer(pool), textM(text) {
+    KeptByteBuffer(RoxMempool* pool, const Keeper& keeper, const void* bytes, uint32_t n)
+        : ByteBuffer(pool), keeperM(keeper) {
         // Nobody writes to storage that is borrowed.
-        bytesM.Borrow(reinterpret_cast<unsigned char*>(textM.GetRepN()->MutableBytes()) + offset, n);
+        bytesM.Borrow(static_cast<unsigned char*>(const_cast<void*>(bytes)), n);
     }
 
  private:
-    RoxString textM;
+    Keeper keeperM;
 };
 
 }  // namespace
@@ -91,7 +92,12 @@ ref<ByteBuffer> ByteBuffer::NewSlice(RoxMempool* pool, const ref<ByteBuffer>& ow
 ref<ByteBuffer> ByteBuffer::NewOfText(RoxMempool* pool, const RoxString& text, uint32_t offset, uint32_t n) {
     RoxAssert(offset <= text.NByte() && n <= text.NByte() - offset, "ByteBuffer: range outside its text");
     if (n == 0) return New(pool, nullptr, 0);
-    return ref<ByteBuffer>(new (pool) TextByteBuffer(pool, text, offset, n));
+    return ref<ByteBuffer>(new (pool) KeptByteBuffer<RoxString>(pool, text, text.Utf8() + offset, n));
+}
+
+ref<ByteBuffer> ByteBuffer::NewKept(RoxMempool* pool, const ref<RoxCore>& keeper, const void* bytes,
+                                    uint32_t n) {
+    return ref<ByteBuffer>(new (pool) KeptByteBuffer<ref<RoxCore>>(pool, keeper, bytes, n));
 }
 
 void* ByteBuffer::VkCastHelper(const void* classTag) {

@@ -80,9 +80,13 @@ class ByteBuffer : public RoxCore {
     /// A new one in the pool of n bytes of a text from `offset` on, without a copy: it holds the text, whose
     /// pool must outlive it, and has no capacity. The range must lie in the text.
     static ref<ByteBuffer> NewOfText(RoxMempool* pool, const RoxString& text, uint32_t offset, uint32_t n);
+    /// A new one in the pool of n bytes that lie where `keeper` keeps them unchanged as long as it lives. It
+    /// holds a reference on the keeper and has no capacity.
+    static ref<ByteBuffer> NewKept(RoxMempool* pool, const ref<RoxCore>& keeper, const void* bytes,
+                                   uint32_t n);
 
     const unsigned char* GetData() const { return bytesM.GetData(); }  ///< null without storage
-    /// For whoever made the buffer, before it is shared; not for slices and texts.
+    /// For whoever made the buffer, before it is shared; not for bytes that lie somewhere else.
     unsigned char* MutableData() { return bytesM.GetData(); }
     uint32_t GetLength() const { return bytesM.GetLength(); }
     uint32_t GetCapacity() const { return bytesM.GetCapacity(); }

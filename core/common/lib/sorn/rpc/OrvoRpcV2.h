@@ -7,6 +7,10 @@
 
 class RoxMempool;
 
+namespace rox {
+class ByteBuffer;
+}
+
 namespace kelbaselib {
 class Bytesink;
 }
@@ -35,6 +39,11 @@ class OrvoRpcV2 {
     /// Appends the message to the buffer.
     static bool MarshalToString(const ref<OrvoRpcWrapper>& wrapper, ByteBuffer& out, RoxString& error,
                                 RoxMempool* pool, bool pretty);
+    /// The same in a buffer for this one message, in which the text of a body that has to be written is
+    /// written at its place: the message is what stands in the buffer from `begin` on. On a failure the
+    /// buffer's contents say nothing.
+    static bool MarshalInPlace(const ref<OrvoRpcWrapper>& wrapper, ByteBuffer& out, unsigned& begin,
+                               RoxString& error, RoxMempool* pool);
     /// Sets the string, in the pool; it is as it was on failure.
     static bool MarshalToString(const ref<OrvoRpcWrapper>& wrapper, RoxString& out, RoxString& error,
                                 RoxMempool* pool, bool pretty);
@@ -55,6 +64,10 @@ class OrvoRpcV2 {
     /// when the first line is not complete. docs/errors.md has the words.
     static ref<OrvoRpcWrapper> UnmarshalFromString(RoxMempool* pool, const RoxString& input, bool parseBody,
                                                    RoxString& error);
+    /// The same of bytes that do not change and lie in the same pool or in the general heap: the body is a
+    /// slice of them.
+    static ref<OrvoRpcWrapper> UnmarshalFromBytes(RoxMempool* pool, const ref<rox::ByteBuffer>& input,
+                                                  bool parseBody, RoxString& error);
     /// True when the text begins with a whole message, or with a bad first line: then `length` is the bytes
     /// of the message, or of the whole text, and `error` the words about the first line or empty.
     static bool IsCompleteString(RoxMempool* pool, const RoxString& input, unsigned int& length,

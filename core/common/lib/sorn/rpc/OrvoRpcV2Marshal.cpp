@@ -75,7 +75,12 @@ class Framing {
         bodyLengthM = static_cast<unsigned>(length);
         return true;
     }
-    bool MakeHeaders();
+    /// The header block; whether it is small enough is for CheckHeaders.
+    void MakeHeaders();
+    bool CheckHeaders() {
+        return (areHeadersWholeM && headersM.GetLength() <= OrvoRpcV2::maxHeaderLengthG) ||
+               Fail("Orvo Rpc headers are too large");
+    }
     /// The bytes of a body that is JSON text as it is, else null.
     const rox::ByteBuffer* GetReadyText(bool pretty) const {
         const bool isReady = knownM.body != nullptr && !pretty && knownM.body->GetRep() == LazyDict::REP_JSON;
@@ -104,6 +109,7 @@ class Framing {
     ReservedHeaders reservedM;
     Known knownM;
     ByteBuffer headersM;
+    bool areHeadersWholeM = true;
     unsigned bodyLengthM = 0;
 };
 
@@ -130,18 +136,15 @@ bool Framing::AppendDictionary() {
     return true;
 }
 
-bool Framing::MakeHeaders() {
+void Framing::MakeHeaders() {
     const bool hasReservedOnly =
         knownM.isKnown && (knownM.optionalHeaders == nullptr || knownM.optionalHeaders->CountNames() == 0);
-    bool isComplete = true;
     if (hasReservedOnly) {
         AppendReserved();
     } else {
-        isComplete = AppendDictionary();
+        areHeadersWholeM = AppendDictionary();
     }
     headersM.AppendLiteral("\r\n");
-    return (isComplete && headersM.GetLength() <= OrvoRpcV2::maxHeaderLengthG) ||
-           Fail("Orvo Rpc headers are too large");
 }
 
 /// Makes the message and hands its three pieces to `put(pieces)`.
@@ -156,7 +159,9 @@ bool Marshal(const ref<OrvoRpcWrapper>& wrapper, RoxString& error, RoxMempool* p
         wrapper->BodyToJsonByteBuffer(scratch, pretty);
         body = {reinterpret_cast<const char*>(scratch.GetData()), scratch.GetLength()};
     }
-    if (!framing.CheckBody(body.size()) || !framing.MakeHeaders()) return false;
+    if (!framing.CheckBody(body.size())) return false;
+    framing.MakeHeaders();
+    if (!framing.CheckHeaders()) return false;
     char line[Framing::maxFirstLineG];
     const ByteBuffer& headers = framing.GetHeaders();
     put(std::string_view(line, framing.WriteFirstLine(line)),
@@ -174,6 +179,30 @@ bool OrvoRpcV2::MarshalToString(const ref<OrvoRpcWrapper>& wrapper, ByteBuffer& 
                        AppendView(out, headers);
                        AppendView(out, body);
                    });
+}
+
+/// The body's length is known when the body stands there: then the first line is put in front.
+bool OrvoRpcV2::MarshalInPlace(const ref<OrvoRpcWrapper>& wrapper, ByteBuffer& out, unsigned& begin,
+                               RoxString& error, RoxMempool* pool) {
+    constexpr unsigned roomG = Framing::maxFirstLineG;
+    Framing framing(*wrapper, error, pool);
+    const rox::ByteBuffer* const text = framing.GetReadyText(false);
+    if (text != nullptr && !framing.CheckBody(text->GetLength())) return false;
+    framing.MakeHeaders();
+    const ByteBuffer& headers = framing.GetHeaders();
+    out.Clear();
+    out.Reserve(roomG);
+    out.Commit(roomG);
+    out.AppendBytes(headers.GetData(), headers.GetLength());
+    wrapper->BodyToJsonByteBuffer(out, false);
+    if (!framing.CheckBody(out.GetLength() - roomG - headers.GetLength()) || !framing.CheckHeaders()) {
+        return false;
+    }
+    char line[roomG];
+    const unsigned nLine = framing.WriteFirstLine(line);
+    begin = roomG - nLine;
+    out.Overwrite(begin, line, nLine);
+    return true;
 }
 
 bool OrvoRpcV2::MarshalToString(const ref<OrvoRpcWrapper>& wrapper, RoxString& out, RoxString& error,
@@ -201,7 +230,9 @@ bool OrvoRpcV2::MarshalToBytesink(const ref<OrvoRpcWrapper>& wrapper, kelbaselib
     Framing framing(*wrapper, error, pool);
     kelbaselib::ByteCountingBytesink counter;
     wrapper->BodyToJsonByteSink(counter, pretty);
-    if (!framing.CheckBody(counter.GetWrittenBytes()) || !framing.MakeHeaders()) return false;
+    if (!framing.CheckBody(counter.GetWrittenBytes())) return false;
+    framing.MakeHeaders();
+    if (!framing.CheckHeaders()) return false;
 
     char line[Framing::maxFirstLineG];
     out.Write(line, framing.WriteFirstLine(line));

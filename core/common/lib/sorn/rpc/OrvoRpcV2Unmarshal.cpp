@@ -38,10 +38,50 @@ uint32_t SpanEnd(std::string_view text, uint32_t begin, uint32_t n) {
     return begin + static_cast<uint32_t>(end);
 }
 
+/// What a message is read from.
+class Input {
+ public:
+    std::string_view View() const { return viewM; }
+    /// Some of the bytes, for a body in the pool; not copied where they live long enough.
+    virtual ref<rox::ByteBuffer> Part(RoxMempool* pool, uint32_t offset, uint32_t n) const = 0;
+
+ protected:
+    explicit Input(std::string_view view) : viewM(view) {}
+    ~Input() = default;
+
+    std::string_view viewM;
+};
+
+class TextInput final : public Input {
+ public:
+    explicit TextInput(const RoxString& text) : Input(text.View()), textM(text) {}
+    ref<rox::ByteBuffer> Part(RoxMempool* pool, uint32_t offset, uint32_t n) const override {
+        const RoxMempool* const own = textM.GetMempool();
+        const bool isShared = own == nullptr || own == pool;  // otherwise the text may die before the body
+        return isShared ? rox::ByteBuffer::NewOfText(pool, textM, offset, n)
+                        : rox::ByteBuffer::New(pool, viewM.data() + offset, n);
+    }
+
+ private:
+    const RoxString& textM;
+};
+
+class BytesInput final : public Input {
+ public:
+    explicit BytesInput(const ref<rox::ByteBuffer>& bytes)
+        : Input({reinterpret_cast<const char*>(bytes->GetData()), bytes->GetLength()}), bytesM(bytes) {}
+    ref<rox::ByteBuffer> Part(RoxMempool* pool, uint32_t offset, uint32_t n) const override {
+        return rox::ByteBuffer::NewSlice(pool, bytesM, offset, n);
+    }
+
+ private:
+    const ref<rox::ByteBuffer>& bytesM;
+};
+
 /// Reads one message; a step that fails leaves words.
 class MessageReader {
  public:
-    MessageReader(RoxMempool* pool, const RoxString& input, bool parseBody, RoxString& error)
+    MessageReader(RoxMempool* pool, const Input& input, bool parseBody, RoxString& error)
         : poolM(pool), inputM(input), isBodyParsedM(parseBody), errorM(error), headersM(pool) {}
 
     ref<OrvoRpcWrapper> Read();
@@ -62,7 +102,7 @@ class MessageReader {
     }
 
     RoxMempool* poolM;
-    const RoxString& inputM;
+    const Input& inputM;
     bool isBodyParsedM;
     RoxString& errorM;
     HeaderBlock headersM;
@@ -110,12 +150,11 @@ bool MessageReader::ReadCommonHeaders() {
 }
 
 bool MessageReader::MakeBody() {
-    const auto* const text = inputM.Utf8() + bodyBeginM;
     if (bodyLengthM == 0) return Fail("Missing message body");
     if (isBodyParsedM) {
         RoxString words;
-        const ref<Dictionary> dictionary =
-            Dictionary::FromJson(RoxString::FromUtf8Bytes(poolM, bodyLengthM, text), words, poolM);
+        const ref<Dictionary> dictionary = Dictionary::FromJson(
+            RoxString::FromUtf8Bytes(poolM, bodyLengthM, inputM.View().data() + bodyBeginM), words, poolM);
         if (dictionary == nullptr) {
             errorM.FormatAndSet("Cannot convert JSON to Dict: %s", words.Utf8());
             return false;
@@ -123,13 +162,7 @@ bool MessageReader::MakeBody() {
         bodyM = LazyDict::FromDictionary(poolM, dictionary, versionM);
         return true;
     }
-    const RoxMempool* const pool = inputM.GetMempool();
-    const bool isShared = pool == nullptr || pool == poolM;  // otherwise the text may die before the body
-    bodyM =
-        LazyDict::FromBytestring(poolM,
-                                 isShared ? rox::ByteBuffer::NewOfText(poolM, inputM, bodyBeginM, bodyLengthM)
-                                          : rox::ByteBuffer::New(poolM, text, bodyLengthM),
-                                 versionM);
+    bodyM = LazyDict::FromBytestring(poolM, inputM.Part(poolM, bodyBeginM, bodyLengthM), versionM);
     // A text that opens with a NUL is none.
     return bodyM != nullptr || Fail("Missing message body");
 }
@@ -205,7 +238,12 @@ ref<OrvoRpcWrapper> MessageReader::Read() {
 
 ref<OrvoRpcWrapper> OrvoRpcV2::UnmarshalFromString(RoxMempool* pool, const RoxString& input, bool parseBody,
                                                    RoxString& error) {
-    return MessageReader(pool, input, parseBody, error).Read();
+    return MessageReader(pool, TextInput(input), parseBody, error).Read();
+}
+
+ref<OrvoRpcWrapper> OrvoRpcV2::UnmarshalFromBytes(RoxMempool* pool, const ref<rox::ByteBuffer>& input,
+                                                  bool parseBody, RoxString& error) {
+    return MessageReader(pool, BytesInput(input), parseBody, error).Read();
 }
 
 }  // namespace sorn
