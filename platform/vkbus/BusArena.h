@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstddef>
+#include <utility>
 
 #include "vkbus/BusTypes.h"
 
@@ -9,6 +10,12 @@ class BusArena {
  public:
     explicit BusArena(const VkBusTypeLibrary& library) : pLibraryM(&library) {}
     ~BusArena();
+    /// The memory changes hands.
+    BusArena(BusArena&& other) noexcept
+        : pLibraryM(other.pLibraryM),
+          pFirstM(std::exchange(other.pFirstM, nullptr)),
+          pFreeM(std::exchange(other.pFreeM, nullptr)),
+          nFreeM(std::exchange(other.nFreeM, 0)) {}
     BusArena(const BusArena&) = delete;
     BusArena& operator=(const BusArena&) = delete;
 

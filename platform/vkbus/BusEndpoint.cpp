@@ -118,7 +118,7 @@ bool BusEndpoint::ServeSession(uint64_t tag) {
         if (!session) {
             return false;
         }
-        arrival = session->Take(event.emplace(session->Terms().shape.Library()));
+        arrival = session->Take(event.emplace(*this, session->Terms().shape.Library()));
         if (arrival == BusSession::Arrival::over) {
             notice = session->TakeNotice();
         } else if (arrival == BusSession::Arrival::opened || arrival == BusSession::Arrival::request) {
@@ -169,6 +169,11 @@ void BusEndpoint::Deliver(BusSession& session, BusEvent& event) {
         session.End(VK_BUS_BAD_EVENT);
         LookAfter(session);
     }
+}
+
+void BusEndpoint::Drop(sd_bus_message* message) {
+    RoxMutexHold hold(mutexM);
+    sd_bus_message_unref(message);
 }
 
 void BusEndpoint::LookAfter(BusSession& session) {

@@ -33,6 +33,8 @@ class BusEndpoint : public RoxCore {
     unsigned ProcessOneEvent(const int64_t* limit);
     unsigned Send(BusSession& session, uint32_t eventId, const void* record);
     void CloseSession(BusSession& session);
+    /// Gives up a reference on a message of one of its sessions.
+    void Drop(sd_bus_message* message);
     /// Ends everything; the endpoint only waits for its counts then.
     void Close();
 

@@ -30,12 +30,20 @@ void BusEvent::BeginDelivery() {
 
 void BusEvent::EndDelivery() {
     innermostG = pOuterM;
+    keptM = nullptr;
 }
 
-const BusEvent* BusEvent::Find(uintptr_t word2, uintptr_t word1) {
-    const BusEvent* event = innermostG;
+BusEvent* BusEvent::Find(uintptr_t word2, uintptr_t word1) {
+    BusEvent* event = innermostG;
     while (event != nullptr && (event->Word1() != word1 || event->Word2() != word2)) {
         event = event->pOuterM;
     }
     return event;
+}
+
+const ref<BusKeptEvent>& BusEvent::Keep() {
+    if (!keptM) {
+        keptM = new BusKeptEvent(endpointM, std::move(arenaM), std::exchange(pMessageM, nullptr));
+    }
+    return keptM;
 }

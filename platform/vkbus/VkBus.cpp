@@ -136,3 +136,8 @@ unsigned VkMarshal_UnmarshalSerialEvent(const VkBusTypeLibrary& library, uintptr
     *record = event->Record();
     return VK_BUS_DONE;
 }
+
+ref<RoxCore> VkMarshal_KeepSerialEvent(uintptr_t word2, uintptr_t word1) {
+    BusEvent* event = BusEvent::Find(word2, word1);
+    return event != nullptr ? event->Keep() : nullptr;
+}

@@ -2,6 +2,8 @@
 
 #include <cstdint>
 
+#include "rox/RoxCore.h"
+#include "rox/ref.h"
 #include "vkbus/BusTypes.h"
 
 // The bus: sessions between the processes of one user over a Unix-domain socket, in which typed events pass
@@ -112,7 +114,12 @@ unsigned VkBusListen(const VkBusTypeLibrary& library, unsigned protocolId, unsig
 /// The id of the event that an event callback was called for, given its third word and its second; 0 if they
 /// are not of an event whose callback runs on this thread.
 unsigned VkMarshal_GetTypeFromSerialEvent(uintptr_t word2, uintptr_t word1);
-/// The same event's record, which belongs to the bus and lives until the callback returns. Nothing is stored
+/// The same event's record, which belongs to the bus and lives until the callback returns, or as long as what
+/// VkMarshal_KeepSerialEvent gives. Nothing is stored
 /// on a failure. The library is the one of the connection.
 unsigned VkMarshal_UnmarshalSerialEvent(const VkBusTypeLibrary& library, uintptr_t word2, uintptr_t word1,
                                         const void** record);
+/// What the same event's record lives as long as, so that a large one need not be copied: the caller's
+/// reference, which any thread may drop, after the end of the session and the connection, too. Null for no
+/// event whose callback runs on this thread, and from a bus that cannot do that.
+ref<RoxCore> VkMarshal_KeepSerialEvent(uintptr_t word2, uintptr_t word1);

@@ -41,3 +41,8 @@ unsigned VkMarshal_UnmarshalSerialEvent(const VkBusTypeLibrary& library, uintptr
                                         const void** record) {
     return ScriptedBus::Get().Decode(library, word2, word1, record);
 }
+
+// A bus that cannot do that.
+ref<RoxCore> VkMarshal_KeepSerialEvent(uintptr_t, uintptr_t) {
+    return nullptr;
+}
