@@ -56,7 +56,7 @@ class Row(NamedTuple):
     figure: float  # bytes per second; of memory, bytes
     ratio: float   # ours to this; None for ours
     goal: float    # or None
-    times: tuple   # medians of the 50th and the 99th percentile of single calls in microseconds, or None
+    times: tuple   # of single calls in microseconds: the 50th and the 99th percentile, processor time; or None
 
     @property
     def is_met(self):
@@ -64,7 +64,7 @@ class Row(NamedTuple):
 
 
 def read_figures(paths):
-    """{(work, data): {library: [(figure, p50, p99), ...]}}, in the order of the files; the percentiles may be None."""
+    """{(work, data): {library: [(figure, p50, p99, processor time), ...]}}, in the order of the files; percentiles may be None."""
     figures = {}
     for path in paths:
         with open(path, encoding="utf-8") as file:
@@ -76,14 +76,15 @@ def read_figures(paths):
                 continue
             work, data, library = run["name"].split("/")[:3]
             figure = run["bytes"] if work == MEMORY else run["bytes_per_second"]
-            figures.setdefault((work, data), {}).setdefault(library, []).append((figure, run.get("p50"), run.get("p99")))
+            figures.setdefault((work, data), {}).setdefault(library, []).append(
+                (figure, run.get("p50"), run.get("p99"), run["cpu_time"] / 1e3))
     return figures
 
 
 def rows_of(figures):
     rows = []
     for (work, data), libraries in sorted(figures.items(), key=lambda item: (WORKS.index(item[0][0]), DATA.index(item[0][1]))):
-        medians = {library: statistics.median(figure for figure, _, _ in runs) for library, runs in libraries.items()}
+        medians = {library: statistics.median(figure for figure, *_ in runs) for library, runs in libraries.items()}
         for library, figure in sorted(medians.items(), key=lambda item: (item[0] != OURS, item[0])):
             ratio = None if library == OURS or OURS not in medians else medians[OURS] / figure
             goal = GOALS_OF_DATA.get((work, data, library), GOALS.get((work, library)))
@@ -100,7 +101,7 @@ def print_rows(rows):
         if row.goal is not None and row.ratio is not None:
             goal = f"{row.goal:g}".rjust(7) + ("  met" if row.is_met else "  not met")
         figure = f"{row.figure / 1e3:.1f} kB" if row.work == MEMORY else f"{row.figure / 1e6:.1f}"
-        times = "" if row.times is None else "  p50 {:.1f} us, p99 {:.1f} us".format(*row.times)
+        times = "" if row.times is None else "  p50 {:.1f} us, p99 {:.1f} us, processors {:.1f} us".format(*row.times)
         print(f"{row.work:<22}{row.data:<15}{row.library:<21}{figure:>11}{ratio:>11}{goal}{times}")
 
 

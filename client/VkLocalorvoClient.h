@@ -165,7 +165,7 @@ class VkLocalorvoClient : public RoxCore {
     static unsigned OnBusEvent(uint32_t session, uintptr_t word1, uintptr_t word2, void* client);
     static void OnBusClosed(uint32_t session, uintptr_t reason, void* client);
     bool TakeEvent(uintptr_t word1, uintptr_t word2);
-    void HandleMessage(const RoxString& text);
+    void HandleMessage(const ref<sorn::OrvoRpcWrapper>& message);
     void Deliver(const ref<sorn::ResponseWrapper>& response);
 
     static std::atomic<Observer> observerG;

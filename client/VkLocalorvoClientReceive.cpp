@@ -1,9 +1,9 @@
 #include "client/BusTypeLibrary.h"
 #include "client/DeliveryOfThread.h"
+#include "client/EventMessage.h"
 #include "client/VkLocalorvoClient.h"
 #include "rox/RoxMutexHold.h"
 #include "rox/RoxSpinLockHold.h"
-#include "sorn/rpc/OrvoRpcV2.h"
 #include "vkbus/VkBus.h"
 
 using sorn::RequestWrapper;
@@ -36,15 +36,14 @@ bool VkLocalorvoClient::TakeEvent(uintptr_t word1, uintptr_t word2) {
     if (VkMarshal_UnmarshalSerialEvent(busTypeLibrary, word2, word1, &record) != 0) return false;
     const auto& packet = static_cast<const VkAesResponse*>(record)->orpcV2Packet;
     Observe(false, packet.vElement, packet.count);
-    HandleMessage(RoxString::FromUtf8Bytes(GetMempool(), packet.count, packet.vElement));
+    if (ignoreAllM) return true;
+    RoxString error;
+    HandleMessage(UnmarshalEventMessage(GetMempool(), packet, word1, word2, error));
     return true;
 }
 
-void VkLocalorvoClient::HandleMessage(const RoxString& text) {
-    if (ignoreAllM) return;
-    RoxString error;
-    const ref<sorn::OrvoRpcWrapper> message =
-        sorn::OrvoRpcV2::UnmarshalFromString(GetMempool(), text, false, error);
+/// Only responses that somebody expects matter.
+void VkLocalorvoClient::HandleMessage(const ref<sorn::OrvoRpcWrapper>& message) {
     const ref<ResponseWrapper> response(dynamic_cast<ResponseWrapper*>(message.get()));
     if (response == nullptr || FindRequest(response->GetRpcId()) == nullptr) return;
     RoxMutexHold hold(clientMutexM);

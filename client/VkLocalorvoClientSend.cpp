@@ -63,9 +63,10 @@ bool VkLocalorvoClient::SendPending(const ref<RequestWrapper>& request, void* ca
 VkLocalorvoClient::Sent VkLocalorvoClient::Transmit(const ref<OrvoRpcWrapper>& wrapper, uint32_t session) {
     sorn::ByteBuffer text(GetMempool());
     RoxString error;
-    if (!sorn::OrvoRpcV2::MarshalToString(wrapper, text, error, GetMempool(), false)) return REFUSED;
-    Observe(true, text.GetData(), text.GetLength());
-    const VkAesRequest record = {{text.GetLength(), text.GetData()}};
+    unsigned begin = 0;
+    if (!sorn::OrvoRpcV2::MarshalInPlace(wrapper, text, begin, error, GetMempool())) return REFUSED;
+    const VkAesRequest record = {{text.GetLength() - begin, text.GetData() + begin}};
+    Observe(true, record.orpcV2Packet.vElement, record.orpcV2Packet.count);
     return VkBusMarshalAndSend(session, VkAesRequest::idG, &record) == 0 ? DONE : FAILED;
 }
 

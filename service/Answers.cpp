@@ -24,8 +24,9 @@ RoxString ToText(RoxMempool& pool, std::string_view text) {
 void Answers::SendMessage(uint32_t session, const ref<OrvoRpcWrapper>& message) {
     ByteBuffer bytes(&poolM);
     RoxString words;
-    if (!OrvoRpcV2::MarshalToString(message, bytes, words, &poolM, false)) return;
-    sendM(session, {reinterpret_cast<const char*>(bytes.GetData()), bytes.GetLength()});
+    unsigned begin = 0;
+    if (!OrvoRpcV2::MarshalInPlace(message, bytes, begin, words, &poolM)) return;
+    sendM(session, {reinterpret_cast<const char*>(bytes.GetData()) + begin, bytes.GetLength() - begin});
 }
 
 void Answers::SendText(uint32_t session, uint32_t rpcId, bool isFinal, std::string_view text) {

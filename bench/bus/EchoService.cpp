@@ -4,6 +4,7 @@
 #include <cstdlib>
 
 #include "client/BusTypeLibrary.h"
+#include "client/EventMessage.h"
 #include "sorn/dict/ByteBuffer.h"
 #include "sorn/lazy/LazyDict.h"
 #include "sorn/rpc/OrvoRpcV2.h"
@@ -23,8 +24,9 @@ constexpr char changeG[] = "{\"type\":\"recordingList\",\"isTop\":true}";
 void Send(RoxMempool* pool, uint32_t session, const ref<sorn::OrvoRpcWrapper>& response) {
     sorn::ByteBuffer text(pool);
     RoxString error;
-    if (!OrvoRpcV2::MarshalToString(response, text, error, pool, false)) return;
-    const VkAesResponse record = {{text.GetLength(), text.GetData()}};
+    unsigned begin = 0;
+    if (!OrvoRpcV2::MarshalInPlace(response, text, begin, error, pool)) return;
+    const VkAesResponse record = {{text.GetLength() - begin, text.GetData() + begin}};
     VkBusMarshalAndSend(session, VkAesResponse::idG, &record);
 }
 
@@ -68,8 +70,11 @@ unsigned EchoService::OnEvent(uint32_t session, uintptr_t word1, uintptr_t word2
     if (VkMarshal_GetTypeFromSerialEvent(word2, word1) != VkAesRequest::idG) return 0;  // the hello
     const void* record = nullptr;
     if (VkMarshal_UnmarshalSerialEvent(busTypeLibrary, word2, word1, &record) != 0) return 1;
-    const auto& packet = static_cast<const VkAesRequest*>(record)->orpcV2Packet;
-    static_cast<EchoService*>(self)->Take(session, packet.vElement, packet.count);
+    auto& service = *static_cast<EchoService*>(self);
+    RoxString error;
+    service.Take(session,
+                 UnmarshalEventMessage(&service.poolM, static_cast<const VkAesRequest*>(record)->orpcV2Packet,
+                                       word1, word2, error));
     return 0;
 }
 
@@ -79,10 +84,7 @@ void EchoService::OnClosed(uint32_t session, uintptr_t, void* self) {
     std::erase_if(service->vStreamsM, [session](const Stream& stream) { return stream.session == session; });
 }
 
-void EchoService::Take(uint32_t session, const unsigned char* bytes, uint32_t nBytes) {
-    RoxString error;
-    const ref<sorn::OrvoRpcWrapper> message =
-        OrvoRpcV2::UnmarshalFromString(&poolM, RoxString::FromUtf8Bytes(&poolM, nBytes, bytes), false, error);
+void EchoService::Take(uint32_t session, const ref<sorn::OrvoRpcWrapper>& message) {
     const auto* const request = dynamic_cast<RequestWrapper*>(message.get());
     if (request == nullptr) return;
     if (request->GetResponseCount() == RequestWrapper::RESPONSE_COUNT_MULTIPLE) {

@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "rox/RoxMempool.h"
+#include "sorn/rpc/OrvoRpcWrapper.h"
 
 namespace bench {
 
@@ -27,7 +28,7 @@ class EchoService {
     static unsigned OnEvent(uint32_t session, uintptr_t word1, uintptr_t word2, void* self);
     static void OnClosed(uint32_t session, uintptr_t reason, void* self);
     void Run();
-    void Take(uint32_t session, const unsigned char* bytes, uint32_t nBytes);
+    void Take(uint32_t session, const ref<sorn::OrvoRpcWrapper>& message);
 
     struct Stream {
         uint32_t session;

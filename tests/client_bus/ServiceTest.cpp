@@ -24,6 +24,31 @@ TEST_F(ServiceTest, AnswersOfAllKinds) {
     EXPECT_EQ(1u, service.nHellos);
 }
 
+/// Bodies below and above the size from which they keep the bytes that came in.
+TEST_F(ServiceTest, BodiesOutliveTheConnection) {
+    std::vector<ref<sorn::LazyDict>> bodies;
+    std::vector<std::string> texts;
+    {
+        Service service;
+        const ref<VkLocalorvoClient> client = VkLocalorvoClient::Get();
+        for (const size_t n : {100u, 60'000u, 70'000u, 5'000'000u}) {
+            texts.emplace_back(n, 'x');
+            bodies.emplace_back();
+            ASSERT_TRUE(client->SendRequestSync(Object(texts.back()).get(), bodies.back()));
+            ASSERT_NE(nullptr, bodies.back());
+        }
+    }
+    VkLocalorvoClient::Destroy();
+    VkBusCloseAll();
+    for (size_t i = 0; i < bodies.size(); ++i) {
+        // The object has no code; the number of none has no name.
+        const std::string wanted =
+            "{\"code\": \"INVALID_VALUE:0\", \"text\": \"" + texts[i] + "\", \"type\": \"error\"}";
+        const RoxString json = bodies[i]->ToJson(false);
+        EXPECT_TRUE(json.View() == wanted) << json.View().substr(0, 100);
+    }
+}
+
 TEST_F(ServiceTest, NobodyListens) {
     const ref<VkLocalorvoClient> client = VkLocalorvoClient::Get();
     ASSERT_NE(nullptr, client);
