@@ -78,11 +78,16 @@ BusAddress::BusAddress() : addressM{}, fOwnFolderM(false) {
     fFitsM = length > 0 && static_cast<size_t>(length) < size;
 }
 
-bool BusAddress::FOurUser(const BusFd& connected) {
+bool BusAddress::FOurUser(const BusFd& connected, pid_t* process) {
     ucred peer;
     socklen_t size = sizeof(peer);
-    return getsockopt(connected.Get(), SOL_SOCKET, SO_PEERCRED, &peer, &size) == 0 &&
-           (peer.uid == geteuid() || peer.uid == 0);
+    if (getsockopt(connected.Get(), SOL_SOCKET, SO_PEERCRED, &peer, &size) != 0) {
+        return false;
+    }
+    if (process != nullptr) {
+        *process = peer.pid;
+    }
+    return peer.uid == geteuid() || peer.uid == 0;
 }
 
 unsigned BusAddress::Connect(BusFd& connected) const {

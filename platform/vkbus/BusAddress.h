@@ -27,8 +27,9 @@ class BusAddress {
     /// Removes the path of the socket that Listen made, if it is still that socket's.
     void Remove() const;
 
-    /// Whether the process at the other end of a connected socket belongs to our user or to root.
-    static bool FOurUser(const BusFd& connected);
+    /// Whether the process at the other end of a connected socket belongs to our user or to root. Gives the
+    /// process, 0 for one of other numbers than ours.
+    static bool FOurUser(const BusFd& connected, pid_t* process = nullptr);
 
  private:
     bool MakeFolder() const;

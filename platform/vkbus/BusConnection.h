@@ -18,7 +18,7 @@ class BusConnection : public BusEndpoint {
     const BusShape& Shape() const { return shapeM; }
 
  private:
-    void OnSessionOver() override { BeOver(); }
+    void OnSessionOver(uint32_t) override { BeOver(); }
     void OnClose() override { socketM.Close(); }
     void WaitForQueue(BusSession& session) override;
 

@@ -193,7 +193,7 @@ void BusEndpoint::LookAfter(BusSession& session) {
         }
     }
     if (sessionsM.erase(session.Handle()) > 0) {
-        OnSessionOver();
+        OnSessionOver(session.Handle());
     }
 }
 

@@ -50,7 +50,7 @@ class BusEndpoint : public RoxCore {
     void BeOver();
 
     // What the two kinds do differently; all but the last are called with the lock held.
-    virtual void OnSessionOver() {}
+    virtual void OnSessionOver(uint32_t) {}
     virtual void OnConnect() {}
     virtual void OnTimer() {}
     virtual void OnClose() {}

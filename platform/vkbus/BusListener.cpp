@@ -45,12 +45,21 @@ void BusListener::OnConnect() {
         }
         return;
     }
-    if (!BusAddress::FOurUser(socket) || sessionsM.size() >= maxVkBusSessionsG) {
+    pid_t process = 0;
+    if (!BusAddress::FOurUser(socket, &process) || !FRoomFor(process)) {
         return;
     }
-    if (Add(std::move(socket), termsM, std::string())) {
+    const ref<BusSession> session = Add(std::move(socket), termsM, std::string());
+    if (session) {
+        processesM[session->Handle()] = process;
         SetTimer();
     }
+}
+
+bool BusListener::FRoomFor(pid_t process) const {
+    const auto nOfProcess = std::count_if(processesM.begin(), processesM.end(),
+                                          [process](const auto& each) { return each.second == process; });
+    return sessionsM.size() < maxVkBusSessionsG && nOfProcess < maxVkBusSessionsOfProcessG;
 }
 
 // A socket that nobody is accepted from would be ready all the time.
@@ -68,7 +77,8 @@ void BusListener::Resume() {
     }
 }
 
-void BusListener::OnSessionOver() {
+void BusListener::OnSessionOver(uint32_t session) {
+    processesM.erase(session);
     Resume();
 }
 

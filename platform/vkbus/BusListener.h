@@ -13,10 +13,11 @@ class BusListener : public BusEndpoint {
     ~BusListener() override;
 
  private:
-    void OnSessionOver() override;
+    void OnSessionOver(uint32_t session) override;
     void OnConnect() override;
     void OnTimer() override;
     void OnClose() override;
+    bool FRoomFor(pid_t process) const;
     void Pause();
     void Resume();
     void SetTimer();
@@ -24,5 +25,6 @@ class BusListener : public BusEndpoint {
     const BusSessionTerms termsM;
     BusAddress addressM;
     BusFd listeningM;
-    bool fPausedM = false;  // for want of descriptors
+    std::unordered_map<uint32_t, pid_t> processesM;  // of the sessions
+    bool fPausedM = false;                           // for want of descriptors
 };

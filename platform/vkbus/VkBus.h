@@ -43,8 +43,9 @@ constexpr uint32_t maxVkBusEventBytesG = 8u << 20;
 /// counts for vkBusEventOverheadG more than it has.
 constexpr uint32_t maxVkBusQueuedBytesG = 16u << 20;
 constexpr uint32_t vkBusEventOverheadG = 1024;
-/// Most sessions of a listener; further ones are closed at once.
-constexpr unsigned maxVkBusSessionsG = 512;
+/// Most sessions of a listener, and of one process with it; further ones are closed at once.
+constexpr unsigned maxVkBusSessionsG = 256;
+constexpr unsigned maxVkBusSessionsOfProcessG = 32;
 /// Nanoseconds that the opening of a session may take, at either end.
 constexpr int64_t vkBusOpeningLimitG = 5'000'000'000;
 /// Nanoseconds for which a client's send waits for the service to take what the kernel does not hold.

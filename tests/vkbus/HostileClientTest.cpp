@@ -1,5 +1,8 @@
+#include <fcntl.h>
 #include <gtest/gtest.h>
+#include <signal.h>
 #include <sys/resource.h>
+#include <sys/wait.h>
 
 #include <random>
 
@@ -283,35 +286,94 @@ class DescriptorLimit {
     rlimit beforeM;
 };
 
-TEST_F(HostileClient, TwoHundredAtOnce) {
-    const DescriptorLimit limit(4096);
-    ASSERT_TRUE(limit.fEnough);
+TEST_F(HostileClient, ThirtyAtOnce) {
     std::vector<std::unique_ptr<Client>> clients;
-    for (int i = 0; i < 200; ++i) {
+    for (size_t i = 0; i < 30; ++i) {
         clients.push_back(std::make_unique<Client>());
         ASSERT_EQ(VK_BUS_DONE, clients.back()->openResult);
     }
-    for (int i = 0; i < 200; ++i) {
-        ASSERT_EQ(VK_BUS_DONE, clients[static_cast<size_t>(i)]->Request(std::to_string(i)));
+    for (size_t i = 0; i < clients.size(); ++i) {
+        ASSERT_EQ(VK_BUS_DONE, clients[i]->Request(std::to_string(i)));
     }
-    for (int i = 0; i < 200; ++i) {
-        ASSERT_EQ(VK_BUS_DONE, clients[static_cast<size_t>(i)]->Process());
-        ASSERT_EQ(std::vector<std::string>{std::to_string(i)}, clients[static_cast<size_t>(i)]->packets);
+    for (size_t i = 0; i < clients.size(); ++i) {
+        ASSERT_EQ(VK_BUS_DONE, clients[i]->Process());
+        ASSERT_EQ(std::vector<std::string>{std::to_string(i)}, clients[i]->packets);
     }
 }
+
+// A process with so many sessions.
+class ProcessWithSessions {
+ public:
+    ProcessWithSessions(const std::string& address, unsigned nSessions) {
+        int vEnds[2];
+        EXPECT_EQ(0, pipe2(vEnds, O_CLOEXEC));
+        processM = fork();
+        if (processM == 0) {
+            const char told = Open(address, nSessions) ? 'y' : 'n';
+            while (write(vEnds[1], &told, 1) == 1) {
+                pause();
+            }
+            _exit(1);
+        }
+        char told = 0;
+        fOpen = read(vEnds[0], &told, 1) == 1 && told == 'y';
+        close(vEnds[0]);
+        close(vEnds[1]);
+    }
+    ~ProcessWithSessions() {
+        kill(processM, SIGKILL);
+        EXPECT_EQ(processM, waitpid(processM, nullptr, 0));
+    }
+    ProcessWithSessions(const ProcessWithSessions&) = delete;
+    ProcessWithSessions& operator=(const ProcessWithSessions&) = delete;
+
+    bool fOpen = false;  // all of them
+
+ private:
+    static bool Open(const std::string& address, unsigned nSessions) {
+        static std::vector<RawPeer> peers;
+        for (unsigned i = 0; i < nSessions; ++i) {
+            peers.emplace_back(address);
+            if (!peers.back().Send(ClientGreeting() + OpenMessage() + HelloMessage())) {
+                return false;
+            }
+        }
+        return true;
+    }
+
+    pid_t processM;
+};
 
 TEST_F(HostileClient, MoreThanTheListenerTakes) {
     const DescriptorLimit limit(4096);
     ASSERT_TRUE(limit.fEnough);
-    std::vector<RawPeer> peers;
-    for (unsigned i = 0; i < maxVkBusSessionsG; ++i) {
-        peers.emplace_back(address);
-        ASSERT_TRUE(peers.back().Send(ClientGreeting() + OpenMessage() + HelloMessage()));
+    constexpr unsigned nProcesses = maxVkBusSessionsG / maxVkBusSessionsOfProcessG;
+    std::vector<std::unique_ptr<ProcessWithSessions>> processes;
+    for (unsigned i = 0; i < nProcesses; ++i) {
+        processes.push_back(std::make_unique<ProcessWithSessions>(address, maxVkBusSessionsOfProcessG));
+        ASSERT_TRUE(processes.back()->fOpen);
     }
     ASSERT_TRUE(WaitUntil([&] { return service.nAccepted == maxVkBusSessionsG; }));
     EXPECT_EQ("", SendAndReadToEnd(""));
+    processes.pop_back();
+    ASSERT_TRUE(WaitUntil([&] { return service.nClosed == maxVkBusSessionsOfProcessG; }));
+    EXPECT_EQ("again", Client().RoundTrip("again"));
+}
+
+TEST_F(HostileClient, MoreThanAProcessMayHave) {
+    const DescriptorLimit limit(4096);
+    ASSERT_TRUE(limit.fEnough);
+    std::vector<RawPeer> peers;
+    for (unsigned i = 0; i < maxVkBusSessionsOfProcessG; ++i) {
+        peers.emplace_back(address);
+        ASSERT_TRUE(peers.back().Send(ClientGreeting() + OpenMessage() + HelloMessage()));
+    }
+    ASSERT_TRUE(WaitUntil([&] { return service.nAccepted == maxVkBusSessionsOfProcessG; }));
+    EXPECT_EQ("", SendAndReadToEnd(""));
+    EXPECT_TRUE(ProcessWithSessions(address, 3).fOpen);
+    EXPECT_TRUE(WaitUntil([&] { return service.nAccepted == maxVkBusSessionsOfProcessG + 3; }));
     peers.pop_back();
-    ASSERT_TRUE(WaitUntil([&] { return service.nClosed == 1; }));
+    ASSERT_TRUE(WaitUntil([&] { return service.nClosed == 4; }));
     EXPECT_EQ("again", Client().RoundTrip("again"));
 }
 
