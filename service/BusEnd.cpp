@@ -1,7 +1,6 @@
 #include "service/BusEnd.h"
 
 #include "client/BusTypeLibrary.h"
-#include "vkbus/BusAddress.h"
 #include "vkbus/VkBus.h"
 
 namespace sorn::service {
@@ -19,7 +18,7 @@ BusEnd::~BusEnd() {
 
 bool BusEnd::Listen(const std::string& address, std::string& words) {
     if (!address.empty()) VkBusSetAddress(address.c_str());
-    addressM = BusAddress().Path();
+    addressM = VkBusGetAddress();
     const unsigned result =
         VkBusListen(busTypeLibrary, VkAesQueryProtocol::idG, VkAesQueryProtocol::checksumG, nullptr, &Event,
                     &Closed, this, &listenerM);

@@ -109,17 +109,19 @@ bool Changes::Remove(const RequestBody& body, Failure& failure) {
 bool Changes::Store(const RequestPlan& plan, const RequestBody& body, Failure& failure) {
     const ref<SornObject> object = body.ToObject(&poolM, failure);
     if (object == nullptr) return false;
+    const StructInfo& record = *plan.pRecord;
     std::vector<std::string> vTexts;
     for (int32_t slot = 0; slot < body.pType->nFields; ++slot) {
         const FieldInfo* const field = body.pType->SelectFieldVariant(slot, body.version);
-        if (field != nullptr && field->Type() == SORN_DATA_TYPE_OBJECT &&
-            Schema::FindStruct(field->typeRef) == plan.pRecord) {
+        const bool isObject = field != nullptr && field->Type() == SORN_DATA_TYPE_OBJECT;
+        const StructInfo* const type = isObject ? Schema::FindStruct(field->typeRef) : nullptr;
+        if (type != nullptr && type == &record) {
             const char* const name = body.pType->FieldName(*field);
-            if (AddRecordTexts(body.dictionary->Find(name), *plan.pRecord, vTexts)) continue;
+            if (AddRecordTexts(body.dictionary->Find(name), record, vTexts)) continue;
             return failure.Set(ErrorCode::badArgumentG, std::string(name) + " has more than such records");
         }
     }
-    if (vTexts.empty()) vTexts.push_back(SharedText(poolM, body, *plan.pRecord));
+    if (vTexts.empty()) vTexts.push_back(SharedText(poolM, body, record));
     return PutAll(vTexts, body.version, failure);
 }
 

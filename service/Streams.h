@@ -19,6 +19,7 @@ struct StreamId {
     uint32_t session;
     uint32_t rpcId;
 
+    // A false alarm at defaulted comparisons. NOLINTNEXTLINE(modernize-use-nullptr)
     friend auto operator<=>(const StreamId&, const StreamId&) = default;
 };
 

@@ -4,6 +4,7 @@
 
 using Type = VkBusTypeDescriptor;
 
+// NOLINTNEXTLINE(misc-redundant-expression): not on every machine
 static_assert(alignof(int64_t) == 8 && alignof(void*) == sizeof(void*) && sizeof(bool) == 1,
               "simple values are aligned to their size");
 

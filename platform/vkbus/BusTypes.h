@@ -73,6 +73,7 @@ struct BusEnumItemDescriptor {
     int32_t value;
 };
 
+// The order of the words is fixed. NOLINTNEXTLINE(clang-analyzer-optin.performance.Padding)
 struct BusEnumDescriptor {
     uint32_t id;
     const char* name;

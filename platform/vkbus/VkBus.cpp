@@ -45,6 +45,10 @@ void VkBusSetAddress(const char* path) {
     BusAddress::Set(path);
 }
 
+std::string VkBusGetAddress() {
+    return BusAddress().Path();
+}
+
 unsigned VkBusOpenNamedConnection(const VkBusTypeLibrary& library, const char* name, uint32_t* connection) {
     return library.format == VkBusTypeLibrary::formatG ? BusConnection::Open(library, name, connection)
                                                        : VK_BUS_BAD_TYPE;

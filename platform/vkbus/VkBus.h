@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <string>
 
 #include "rox/RoxCore.h"
 #include "rox/ref.h"
@@ -66,6 +67,8 @@ using VkBusAcceptCallback = unsigned (*)(uint32_t session, const char* clientNam
 /// the environment says in SORN_BUS, else "sorn-bus" in the folder XDG_RUNTIME_DIR, in /run/user/UID where
 /// that exists, or in /tmp/sorn-UID, which a listener makes and which must belong to the user alone.
 void VkBusSetAddress(const char* path);
+/// The path that is set, or the default one; of one that is too long for a socket, the beginning.
+std::string VkBusGetAddress();
 
 /// Connects to the service on the address under a name (at most 255 bytes of UTF-8) that the service is told,
 /// and stores the handle. Waits only while too many others want to connect, for vkBusOpeningLimitG at most.
