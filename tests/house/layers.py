@@ -61,6 +61,7 @@ LAYERS = {
     "tests/service": Layer("tests/service", "service_test", LIBRARY + ("vkbus", "client", "service", "tests/support")),
     "tests/vkbus": Layer("tests/vkbus", "vkbus_test", ("rox", "vkbus", "client", "tests/support")),
     "tests/client": Layer("tests/client", "client_test", LIBRARY + ("sorn", "vkbus", "client", "tests/support")),
+    "tests/package": Layer("tests/package", "package_test", LIBRARY + ("sorn",)),
     "tests/client_bus": Layer(
         "tests/client_bus", "client_bus_test", LIBRARY + ("sorn", "vkbus", "client", "tests/support", "tests/client")
     ),
