@@ -59,6 +59,7 @@ void VkLocalorvoClient::Deliver(const ref<ResponseWrapper>& response) {
     if (body->GetVersion().FAbsent()) body->SetVersion(PickVersion());
 
     ref<RequestWrapper> request;
+    ref<ResponseWrapper> unread;  // dies when the lock is no longer held
     void* callback = nullptr;
     void* context = nullptr;
     bool isLast = false;
@@ -68,7 +69,10 @@ void VkLocalorvoClient::Deliver(const ref<ResponseWrapper>& response) {
         if (request == nullptr) return;  // another thread has had its response, or has cancelled it
         callback = callbackTableM.Find(rpcId);
         context = contextTableM.Find(rpcId);
-        if (callback == nullptr) responseTableM.Store(rpcId, response);
+        if (callback == nullptr) {
+            unread = responseTableM.Find(rpcId);
+            responseTableM.Store(rpcId, response);
+        }
         isLast = request->GetResponseCount() != RequestWrapper::RESPONSE_COUNT_MULTIPLE ||
                  response->IsFinalResponse();
     }

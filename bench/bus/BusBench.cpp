@@ -86,36 +86,31 @@ ref<sornschema::RecordingSearch> NewSearch(RoxMempool* pool, size_t n) {
     return search;
 }
 
+template <class Benchmark>
+void Register(const std::string& name, Benchmark work) {
+    benchmark::RegisterBenchmark(name.c_str(), work)->MeasureProcessCPUTime()->UseRealTime();
+}
+
 void RegisterRoundTrip(const char* data, size_t nBytes, bool withGrpc) {
     const std::string name = std::string("round trip/") + data + "/";
-    benchmark::RegisterBenchmark(
-        (name + "sorn").c_str(),
-        [nBytes](State& state) {
-            Road road;
-            const ref<sornschema::RecordingSearch> search = NewSearch(road.Pool(), nBytes);
-            MeasureCalls(state, nBytes, [&] {
-                ref<sorn::LazyDict> response;
-                return road.Client().SendRequestSync(search.get(), response) && response != nullptr;
-            });
-        })
-        ->MeasureProcessCPUTime()
-        ->UseRealTime();
-    benchmark::RegisterBenchmark((name + "bare socket").c_str(),
-                                 [nBytes](State& state) {
-                                     bench::SocketEcho echo(nBytes);
-                                     MeasureCalls(state, nBytes, [&] { return echo.Ask(); });
-                                 })
-        ->MeasureProcessCPUTime()
-        ->UseRealTime();
+    Register(name + "sorn", [nBytes](State& state) {
+        Road road;
+        const ref<sornschema::RecordingSearch> search = NewSearch(road.Pool(), nBytes);
+        MeasureCalls(state, nBytes, [&] {
+            ref<sorn::LazyDict> response;
+            return road.Client().SendRequestSync(search.get(), response) && response != nullptr;
+        });
+    });
+    Register(name + "bare socket", [nBytes](State& state) {
+        bench::SocketEcho echo(nBytes);
+        MeasureCalls(state, nBytes, [&] { return echo.Ask(); });
+    });
     if (!withGrpc) return;
-    benchmark::RegisterBenchmark((name + "gRPC").c_str(),
-                                 [nBytes](State& state) {
-                                     bench::GrpcEcho echo(Folder() + "/grpc");
-                                     const std::string body(nBytes, 'x');
-                                     MeasureCalls(state, nBytes, [&] { return echo.Ask(body); });
-                                 })
-        ->MeasureProcessCPUTime()
-        ->UseRealTime();
+    Register(name + "gRPC", [nBytes](State& state) {
+        bench::GrpcEcho echo(Folder() + "/grpc");
+        const std::string body(nBytes, 'x');
+        MeasureCalls(state, nBytes, [&] { return echo.Ask(body); });
+    });
 }
 
 std::atomic<int64_t> nDeliveredG{0};
@@ -126,33 +121,27 @@ void WaitForDelivered(int64_t n) {
 
 /// One iteration is one change, which every stream gets.
 void RegisterStreams(const char* library, int64_t nStreams) {
-    const std::string name = std::string("response in a stream/1,000 streams/") + library;
-    benchmark::RegisterBenchmark(
-        name.c_str(),
-        [nStreams](State& state) {
-            Road road;
-            const ref<sornschema::RecordingSearch> search = NewSearch(road.Pool(), 100);
-            nDeliveredG = 0;
-            for (int64_t i = 0; i < nStreams; ++i) {
-                unsigned rpcId = 0;
-                road.Client().SendRequestAsync(
-                    search.get(), true, [](unsigned, bool, const char*) { ++nDeliveredG; }, rpcId);
-            }
-            // All requests are there once a request behind them is answered.
-            ref<sorn::LazyDict> response;
-            if (!road.Client().SendRequestSync(search.get(), response)) state.SkipWithError("no service");
-            int64_t nWanted = 0;
-            for (auto _ : state) {
-                nWanted += nStreams;
-                road.Service().Change();
-                WaitForDelivered(nWanted);
-            }
-            state.SetItemsProcessed(state.iterations() * nStreams);
-            state.SetBytesProcessed(state.iterations() *
-                                    nStreams);  // a byte a response, so that rates compare
-        })
-        ->MeasureProcessCPUTime()
-        ->UseRealTime();
+    Register(std::string("response in a stream/1,000 streams/") + library, [nStreams](State& state) {
+        Road road;
+        const ref<sornschema::RecordingSearch> search = NewSearch(road.Pool(), 100);
+        nDeliveredG = 0;
+        for (int64_t i = 0; i < nStreams; ++i) {
+            unsigned rpcId = 0;
+            road.Client().SendRequestAsync(
+                search.get(), true, [](unsigned, bool, const char*) { ++nDeliveredG; }, rpcId);
+        }
+        // All requests are there once a request behind them is answered.
+        ref<sorn::LazyDict> response;
+        if (!road.Client().SendRequestSync(search.get(), response)) state.SkipWithError("no service");
+        int64_t nWanted = 0;
+        for (auto _ : state) {
+            nWanted += nStreams;
+            road.Service().Change();
+            WaitForDelivered(nWanted);
+        }
+        state.SetItemsProcessed(state.iterations() * nStreams);
+        state.SetBytesProcessed(state.iterations() * nStreams);  // a byte a response, so that rates compare
+    });
 }
 
 }  // namespace

@@ -49,6 +49,17 @@ TEST_F(ServiceTest, BodiesOutliveTheConnection) {
     }
 }
 
+/// Each replaces the one before, for which nobody came.
+TEST_F(ServiceTest, LargeResponsesThatNobodyReads) {
+    Service service;
+    const ref<VkLocalorvoClient> client = VkLocalorvoClient::Get();
+    unsigned rpcId = 0;
+    VkLocalorvoClient::Callback none = nullptr;
+    EXPECT_TRUE(client->SendRequestAsync(Object(std::string(100'000, 'x')).get(), true, none, rpcId));
+    EXPECT_TRUE(WaitUntil([&] { return !client->FPending(rpcId); }));
+    EXPECT_TRUE(FAnswered(client));
+}
+
 TEST_F(ServiceTest, NobodyListens) {
     const ref<VkLocalorvoClient> client = VkLocalorvoClient::Get();
     ASSERT_NE(nullptr, client);
