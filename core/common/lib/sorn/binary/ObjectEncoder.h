@@ -53,8 +53,8 @@ class ObjectEncoder {
     struct Frame {
         const SornObject* pObject;
         const StructPlan* pPlan;       ///< null for a frame of one field
-        uint64_t candidates;           ///< fields that are left of the group under way and have values
-        uint32_t nGroupsLeft;          ///< groups of fields that are left; then comes the one under way
+        uint64_t fields;               ///< those left of the group under way, as FindSet gives them
+        uint32_t nGroupsLeft;          ///< groups that are left; then comes the one under way
         uint32_t nElements;            ///< elements that are left of the field of objects under way
         const PlannedField* pField;    ///< that field
         const PlannedField* pHeadTag;  ///< whose tag stands before the object; null for none
@@ -64,18 +64,28 @@ class ObjectEncoder {
         Form form;
     };
 
+    /// The bytes of a group of fields all of which are single numbers, with what is overwritten before them.
+    static constexpr size_t maxGroupG =
+        StructPlan::nGroupG * (varint::maxBytes64G + WrittenField::maxTagBytesG);
+
     void Run();
-    bool StepFields();
-    bool StartField(Frame& frame, const PlannedField& field);
-    bool OpenElement(Frame& frame);
-    bool OpenLazyBody(const ref<LazyDict>& body, const PlannedField* headTag, Nesting nesting);
+    // What Run calls for every object is inlined into it by force, and what is rare is kept out: together
+    // they are too large for the compiler's taste, and the calls would take a tenth of the time.
+    __attribute__((always_inline)) bool StepFields(Frame& frame);
+    __attribute__((always_inline)) unsigned char* WriteSimple(const unsigned char* object,
+                                                              const WrittenField* group, uint64_t& fields,
+                                                              const WrittenField*& other, unsigned char* p);
+    __attribute__((always_inline)) bool StartField(Frame& frame, const PlannedField& field);
+    __attribute__((always_inline)) void OpenElement(Frame& frame);
+    __attribute__((always_inline)) void Open(const SornObject& object, Form form, const PlannedField* headTag,
+                                             RoxCore* held, Nesting nesting);
+    __attribute__((always_inline)) void Close(const Frame& frame);
+    __attribute__((noinline)) bool OpenLazyBody(const ref<LazyDict>& body, const PlannedField* headTag,
+                                                Nesting nesting);
     bool EnterLazyBody(const ref<LazyDict>& body, Nesting& nesting);
     ref<SornObject> NewTooDeepObject() const;
-    void Open(const SornObject& object, Form form, const PlannedField* headTag, RoxCore* held,
-              Nesting nesting);
     void PushField(const SornObject& object);
-    void Close();
-    void WriteElements(const PlannedField& field, const FieldSource& source);
+    __attribute__((noinline)) void WriteElements(const PlannedField& field, const FieldSource& source);
     unsigned char* WriteBytes(const rox::ByteBuffer& bytes, unsigned char* p);
     unsigned char* WriteAnyDict(const Dict& dict, unsigned char* p);
 

@@ -17,7 +17,7 @@ void ObjectEncoder::WriteElements(const PlannedField& field, const FieldSource& 
         switch (type) {
             case SORN_DATA_TYPE_STRING:
             case SORN_DATA_TYPE_STRING_ID:
-                p = WriteText(outM, source.TextAt(i), p);
+                p = WriteText(outM, source.TextAt(i), p, maxHeadG);
                 break;
             case SORN_DATA_TYPE_BYTESTRING: {
                 const auto* const bytes = source.ReferenceAt<rox::ByteBuffer>(i);

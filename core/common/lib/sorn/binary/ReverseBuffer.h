@@ -46,7 +46,7 @@ class ReverseBuffer {
     void WriteTo(ProtoBufByteOutputStream& stream) const;
 
  private:
-    static constexpr size_t nInPlaceG = 2048;
+    static constexpr size_t nInPlaceG = 4096;
     static constexpr size_t maxBlockG = 64 * 1024;
 
     /// The head of a block that is full: its bytes begin at pFirst and end at pEnd.

@@ -23,6 +23,9 @@ class PlansDestructor {
 
 const PlansDestructor destructorG;
 
+/// Where the count of an object ends, behind its tables and its pool. Other threads may change it.
+constexpr size_t countEndG = 2 * sizeof(void*) + sizeof(uint32_t);
+
 uint32_t WordOf(const FieldInfo& field) {
     return field.presenceOffset / uint32_t{sizeof(size_t)};
 }
@@ -54,10 +57,11 @@ StructPlan* StructPlan::New(const StructInfo& info) {
     const auto nSlots = static_cast<uint32_t>(std::max(info.nFields, 0));
     const uint32_t nGroups = (nSlots + nGroupG - 1) / nGroupG;
     const uint32_t nPresence = CountPresenceWords(info, nSlots);
-    static_assert(sizeof(StructPlan) % alignof(PresenceWord) == 0 && sizeof(Group) % alignof(uint64_t) == 0 &&
-                  sizeof(PlannedField) % alignof(uint64_t) == 0);
+    static_assert(sizeof(StructPlan) % alignof(Group) == 0 && sizeof(Group) % alignof(WrittenField) == 0 &&
+                  sizeof(WrittenField) % alignof(PresenceWord) == 0 &&
+                  sizeof(PresenceWord) % alignof(MemberTest) == 0);
     const size_t nBytes = sizeof(StructPlan) + nGroups * sizeof(Group) + nPresence * sizeof(PresenceWord) +
-                          nSlots * (sizeof(PlannedField) + sizeof(MemberTest));
+                          nSlots * (sizeof(MemberTest) + sizeof(WrittenField) + sizeof(PlannedField));
     return new (RoxMempool::CallocIn(nullptr, nBytes)) StructPlan(info, nPresence);
 }
 
@@ -66,16 +70,18 @@ StructPlan::StructPlan(const StructInfo& info, uint32_t nPresence)
       nObjectBytesM(ObjectBudget::SizeOf(info)),
       nSlotsM(static_cast<uint32_t>(std::max(info.nFields, 0))),
       nGroupsM((nSlotsM + nGroupG - 1) / nGroupG) {
-    auto* presence = reinterpret_cast<PresenceWord*>(Groups() + nGroupsM);
-    vSlotM = reinterpret_cast<PlannedField*>(presence + nPresence);
-    auto* members = reinterpret_cast<MemberTest*>(vSlotM + nSlotsM);
+    auto* written = reinterpret_cast<WrittenField*>(Groups() + nGroupsM);
+    auto* presence = reinterpret_cast<PresenceWord*>(written + nSlotsM);
+    auto* members = reinterpret_cast<MemberTest*>(presence + nPresence);
+    vSlotM = reinterpret_cast<PlannedField*>(members + nSlotsM);
     for (uint32_t slot = 0; slot < nSlotsM; ++slot) {
         Group& group = Groups()[slot / nGroupG];
-        if (slot % nGroupG == 0) group = {0, 0, presence, presence, members, members};
+        if (slot % nGroupG == 0) group = {0, 0, written + slot, presence, presence, members, members};
         const FieldInfo& field = info.vFieldInfo[slot];
         vSlotM[slot] = PlannedField();
         if (field.FHole()) continue;
         vSlotM[slot] = PlannedField(field, wireformat::TagOf(slot, wireformat::WireTypeOf(field.dataType)));
+        group.pWritten[BitOf(slot)] = WrittenFieldOf(slot);
         AddToGroup(field, slot);
         presence = group.pPresenceEnd;
         members = group.pMembersEnd;
@@ -85,7 +91,7 @@ StructPlan::StructPlan(const StructInfo& info, uint32_t nPresence)
 void StructPlan::AddToGroup(const FieldInfo& field, uint32_t slot) {
     static_assert(__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__, "bytes are picked out of words");
     Group& group = Groups()[slot / nGroupG];
-    const auto bit = static_cast<uint16_t>(slot % nGroupG);
+    const uint32_t bit = BitOf(slot);
     const FieldStorage storage = StorageOf(field.Type());
     const bool isMulti = field.arity == SORN_ARITY_MULTI;
     const bool isRequired = field.arity == SORN_ARITY_REQUIRED;
@@ -103,15 +109,33 @@ void StructPlan::AddToGroup(const FieldInfo& field, uint32_t slot) {
     } else {
         // References are written only when they are not null, and so are optional texts here. Containers with
         // values have storage, which their first word leads to.
-        *group.pMembersEnd++ = {SIZE_MAX, field.storageOffset, bit};
+        *group.pMembersEnd++ = {SIZE_MAX, field.storageOffset, static_cast<uint16_t>(bit)};
     }
+}
+
+WrittenField StructPlan::WrittenFieldOf(uint32_t slot) const {
+    const PlannedField& field = vSlotM[slot];
+    const DataType type = field.Type();
+    const auto form = field.FMulti() ? WrittenField::OTHER : WrittenField::FormOf(type);
+    WrittenField written{{}, field.storageOffset, static_cast<uint16_t>(slot), form, 0, field.nTagBytes};
+    std::memcpy(written.tagBytes, field.tagBytes, sizeof written.tagBytes);
+    if (written.FNumber()) {
+        const unsigned nBefore = static_cast<unsigned>(sizeof(uint64_t)) - WrittenField::WidthOf(type);
+        if (field.storageOffset < countEndG + nBefore) {
+            written.form = WrittenField::OTHER;
+            return written;
+        }
+        written.offset = static_cast<uint16_t>(field.storageOffset - nBefore);
+        written.shift = static_cast<uint8_t>(8 * nBefore);
+    }
+    return written;
 }
 
 /// A test of the bytes at an offset that the mask covers, which all lie in one aligned word: so no word that
 /// is looked at leaves the object.
-StructPlan::MemberTest StructPlan::TestOf(size_t offset, uint32_t mask, uint16_t bit) {
+StructPlan::MemberTest StructPlan::TestOf(size_t offset, uint32_t mask, uint32_t bit) {
     const size_t inWord = offset % sizeof(size_t);
-    return {size_t{mask} << 8 * inWord, static_cast<uint16_t>(offset - inWord), bit};
+    return {size_t{mask} << 8 * inWord, static_cast<uint16_t>(offset - inWord), static_cast<uint16_t>(bit)};
 }
 
 void StructPlan::AddPresence(Group& group, uint32_t offset, uint32_t bit) {

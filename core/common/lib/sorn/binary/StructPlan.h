@@ -1,10 +1,16 @@
 #pragma once
 
+#if defined(__SSE2__) && defined(__x86_64__)
+#include <emmintrin.h>
+#endif
+
+#include <algorithm>
 #include <atomic>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
 
+#include "sorn/binary/WrittenField.h"
 #include "sorn/convert/StructTable.h"
 #include "sorn/model/StructInfo.h"
 
@@ -22,8 +28,7 @@ struct PlannedField {
     /// Neither: a slot without a field.
     static constexpr uint8_t holeG = 2 * multiG;
 
-    /// A word, so that it is copied at once.
-    static constexpr size_t maxTagBytesG = 8;
+    static constexpr size_t maxTagBytesG = WrittenField::maxTagBytesG;
 
     PlannedField() = default;
     /// Without a tag.
@@ -67,24 +72,24 @@ class StructPlan {
     /// Slots that are looked at together.
     static constexpr uint32_t nGroupG = 64;
     uint32_t NGroups() const { return nGroupsM; }
-    /// A bit for each slot of a group whose field has a value in the object: an optional one by its presence
-    /// byte, or, without one, by the first 32 bits of its member, a reference by all of it; the bit may stand
-    /// for a repeated field without values, too. Without a branch for each field, since which fields are set
-    /// cannot be foretold.
+    /// The fields of a group, the last slot first.
+    const WrittenField* WrittenOf(uint32_t iGroup) const { return Groups()[iGroup].pWritten; }
+    /// A bit for each slot of a group, the lowest for the last one, whose field has a value in the object: an
+    /// optional one by its presence byte, or, without one, by the first 32 bits of its member, a reference by
+    /// all of it; the bit may stand for a repeated field without values, too. Without a branch for each
+    /// field, since which fields are set cannot be foretold.
     uint64_t FindSet(const void* object, uint32_t iGroup) const {
         const Group& group = Groups()[iGroup];
         uint64_t isSet = group.alwaysSet;
         for (const PresenceWord* word = group.pPresence; word != group.pPresenceEnd; ++word) {
-            const size_t bytes = LoadWord(object, word->offset);
-            if (bytes == 0) continue;
-            const uint64_t bits = NonZeroBytes(bytes);
+            const unsigned bits = NonZeroBytes(LoadWord(object, word->offset));
             isSet |= word->vSet[0][bits % 16];
             if constexpr (nNibblesG == 2) isSet |= word->vSet[nNibblesG - 1][bits / 16];
         }
         for (const MemberTest* test = group.pMembers; test != group.pMembersEnd; ++test) {
             isSet |= uint64_t{(LoadWord(object, test->offset) & test->mask) != 0} << test->bit;
         }
-        Prefetch(object, iGroup, isSet & group.leadsAway);
+        Prefetch(object, group, isSet & group.leadsAway);
         return isSet;
     }
 
@@ -105,6 +110,7 @@ class StructPlan {
     struct Group {
         uint64_t alwaysSet;
         uint64_t leadsAway;  ///< the fields whose member begins with a pointer
+        WrittenField* pWritten;
         PresenceWord* pPresence;
         PresenceWord* pPresenceEnd;
         MemberTest* pMembers;
@@ -112,12 +118,13 @@ class StructPlan {
     };
 
     /// Has what the fields' members lead to brought near, all at once: in a large tree the waiting for memory
-    /// is what writing takes.
-    void Prefetch(const void* object, uint32_t iGroup, uint64_t fields) const {
-        const PlannedField* const group = vSlotM + iGroup * nGroupG;
+    /// is what writing takes. Always inlined, since GCC takes a function that only prefetches for one without
+    /// effect, and drops the call.
+    __attribute__((always_inline)) static void Prefetch(const void* object, const Group& group,
+                                                        uint64_t fields) {
         for (; fields != 0; fields &= fields - 1) {
             const void* p;
-            const uint16_t offset = group[__builtin_ctzll(fields)].storageOffset;
+            const uint16_t offset = group.pWritten[__builtin_ctzll(fields)].offset;
             std::memcpy(&p, static_cast<const char*>(object) + offset, sizeof p);
             __builtin_prefetch(p);
         }
@@ -128,10 +135,16 @@ class StructPlan {
         return word;
     }
     /// A bit for each byte of the word, the lowest for the first one.
-    static uint64_t NonZeroBytes(uint64_t word) {
+    static unsigned NonZeroBytes(size_t word) {
+#if defined(__SSE2__) && defined(__x86_64__)
+        const __m128i bytes = _mm_cvtsi64_si128(static_cast<long long>(word));
+        const int isZero = _mm_movemask_epi8(_mm_cmpeq_epi8(bytes, _mm_setzero_si128()));
+        return static_cast<unsigned>(isZero) ^ 0xFFFF;
+#else
         constexpr uint64_t lowBits = 0x7F7F7F7F7F7F7F7F;
         const uint64_t tops = (((word & lowBits) + lowBits) | word) & ~lowBits;
-        return (tops >> 7) * 0x0102040810204080 >> 56;
+        return static_cast<unsigned>((tops >> 7) * 0x0102040810204080 >> 56);
+#endif
     }
 
     StructPlan(const StructInfo& info, uint32_t nPresence);
@@ -139,11 +152,19 @@ class StructPlan {
     static StructPlan* New(const StructInfo& info);
     static void Delete(StructPlan* plan);
     void AddToGroup(const FieldInfo& field, uint32_t slot);
-    static MemberTest TestOf(size_t offset, uint32_t mask, uint16_t bit);
+    WrittenField WrittenFieldOf(uint32_t slot) const;
+    uint32_t BitOf(uint32_t slot) const {
+        return std::min(nSlotsM - slot / nGroupG * nGroupG, nGroupG) - 1 - slot % nGroupG;
+    }
+    static MemberTest TestOf(size_t offset, uint32_t mask, uint32_t bit);
     static void AddPresence(Group& group, uint32_t offset, uint32_t bit);
     // The groups lie right behind the plan, so that no pointer leads to them; then the rest.
-    Group* Groups() { return reinterpret_cast<Group*>(this + 1); }
-    const Group* Groups() const { return reinterpret_cast<const Group*>(this + 1); }
+    Group* Groups() {
+        return reinterpret_cast<Group*>(this + 1);
+    }
+    const Group* Groups() const {
+        return reinterpret_cast<const Group*>(this + 1);
+    }
 
     const StructInfo& infoM;
     uint32_t nObjectBytesM;

@@ -69,22 +69,39 @@ inline uint64_t JoinGroups(uint64_t bytes) {
 }
 constexpr uint64_t topBitsG = 0x8080808080808080;
 
-/// Writes the shortest form so that it ends before `end`; gives its first byte. Without a branch for each
-/// byte: maxBytes64G bytes before `end` are overwritten.
-inline unsigned char* WriteInRoom(uint64_t value, unsigned char* end) {
+/// The rest of WriteInRoom, for numbers of three bytes and more.
+__attribute__((noinline)) inline unsigned char* WriteLongInRoom(uint64_t value, unsigned char* end) {
     static_assert(__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__);
-    if (value < 0x80) {
-        *--end = static_cast<unsigned char>(value);
-        return end;
+    if (value >> 28 == 0) {
+        const unsigned n = 3 + (value >> 21 != 0);
+        const auto bits = static_cast<uint32_t>(value);
+        uint32_t word = (bits & 0x7F) | (bits & 0x3F80) << 1 | (bits & 0x1FC000) << 2 | (bits >> 21 << 24);
+        word = (word | (n == 4 ? 0x808080 : 0x8080)) << 8 * (4 - n);
+        std::memcpy(end - sizeof word, &word, sizeof word);
+        return end - n;
     }
-    if (value >> 56 != 0) [[unlikely]] {
+    if (value >> 56 != 0) [[unlikely]]
         return WriteBefore(value, end);
-    }
     const unsigned n = Size(value);
     const uint64_t bytes = SpreadGroups(value) | (topBitsG & ((uint64_t{1} << 8 * (n - 1)) - 1));
     const uint64_t word = bytes << (64 - 8 * n);
     std::memcpy(end - sizeof word, &word, sizeof word);
     return end - n;
+}
+
+/// Writes the shortest form so that it ends before `end`; gives its first byte. Without a branch for each
+/// byte: maxBytes64G bytes before `end` are overwritten.
+inline unsigned char* WriteInRoom(uint64_t value, unsigned char* end) {
+    if (value < 0x80) {
+        *--end = static_cast<unsigned char>(value);
+        return end;
+    }
+    if (value < 0x4000) {
+        *--end = static_cast<unsigned char>(value >> 7);
+        *--end = static_cast<unsigned char>(value | 0x80);
+        return end;
+    }
+    return WriteLongInRoom(value, end);
 }
 
 /// Reads a number of at most nMax bytes that lies before `end`; gives the place behind it, or null.

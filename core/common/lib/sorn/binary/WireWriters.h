@@ -70,13 +70,25 @@ __attribute__((always_inline)) inline unsigned char* WritePlain(DataType type, c
     }
 }
 
-/// A longer text goes to the buffer that p lies in.
+/// The rest of WriteText, for texts of more than maxShortG bytes.
+__attribute__((noinline)) inline unsigned char* WriteLongText(ReverseBuffer& out, const RoxString& text,
+                                                              unsigned char* p, size_t nRoom) {
+    p = out.Room(out.Bytes(p, text.Utf8(), text.NByte()), nRoom);
+    return varint::WriteInRoom(text.NByte(), p);
+}
+
+/// Makes the room that it needs and nRoom bytes more, which are maxHeadG at least.
 __attribute__((always_inline)) inline unsigned char* WriteText(ReverseBuffer& out, const RoxString& text,
-                                                               unsigned char* p) {
+                                                               unsigned char* p, size_t nRoom) {
     const uint32_t n = text.NByte();
-    if (n > maxShortG) return varint::WriteInRoom(n, out.Room(out.Bytes(p, text.Utf8(), n), maxHeadG));
-    p -= n;
-    CopyShort(text.Utf8(), n, p);
+    if (n > maxShortG) return WriteLongText(out, text, p, nRoom);
+    p = out.Room(p, maxShortG + nRoom) - n;
+    if (n > 32) {
+        CopyEnds<16>(text.Utf8(), 32, p);
+        CopyEnds<16>(text.Utf8() + n - 32, 32, p + n - 32);
+    } else {
+        CopyShort(text.Utf8(), n, p);
+    }
     *--p = static_cast<unsigned char>(n);
     return p;
 }
