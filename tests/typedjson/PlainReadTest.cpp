@@ -79,6 +79,29 @@ TEST_F(PlainReadTest, LongAndShortMembers) {
     Check(text + "\"requiredString\": \"x\", \"type\": \"everyType\"}", 0);
 }
 
+// The field that came behind another one is looked for first where that one comes again.
+TEST_F(PlainReadTest, KeysThatAreAlmostTheOneBefore) {
+    const std::string rest =
+        ", \"type\": \"everyType\", \"unknown\": \"far enough from the end of the text\"}";
+    const auto text = [&rest](const std::string& key) {
+        return "{\"requiredString\": \"x\", " + key + " 5" + rest;
+    };
+    const std::string usual = "\"optionalS32\":";
+    for (const char* key :
+         {"\"optionalS32\" :", "\"optionalS32x\":", "\"optionalS3\":", "\"xoptionalS32\":", "\"optionalS32:",
+          "optionalS32:", "\"optionalS64\":", "\"requiredString\":", "\"optionalS32\"",
+          "\"optionalS32\"\":", "\"\":", "\"type\":", "\"optional\\u005332\":"}) {
+        Check(text(usual), 1);
+        Check(text(key), 2);
+        Check(text(usual), 3);
+    }
+    // Another struct in between, and the same order again.
+    Check(text("\"optionalObject\": {\"type\": \"error\", \"text\": \"x\", \"code\": \"badArgument\"}, " +
+               usual),
+          4);
+    Check(text(usual), 5);
+}
+
 TEST_F(PlainReadTest, StructsByName) {
     for (uint32_t id = 0; id < Schema::nStructDefG; ++id) {
         const StructInfo* const info = Schema::FindStruct(id);

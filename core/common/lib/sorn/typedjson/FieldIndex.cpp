@@ -1,6 +1,7 @@
 #include "sorn/typedjson/FieldIndex.h"
 
 #include <algorithm>
+#include <atomic>
 #include <new>
 
 #include "rox/RoxMempool.h"
@@ -23,16 +24,37 @@ class FieldIndexDestructor {
 
 const FieldIndexDestructor destructorG;
 
+constinit std::atomic<uint32_t> nextPlaceG = 0;  // of the slots of the next index, for KeyHints
+
 }  // namespace
 
 FieldIndex::FieldIndex(const StructInfo& info)
     : infoM(info),
-      namesM(static_cast<uint32_t>(std::max(info.nFields, 0))),
-      nObjectBytesM(ObjectBudget::SizeOf(info)) {
-    for (int32_t slot = 0; slot < info.nFields; ++slot) {
+      namesM(static_cast<uint32_t>(std::max(info.nFields, 0)) + 1),
+      nObjectBytesM(ObjectBudget::SizeOf(info)),
+      nKeysM(static_cast<uint32_t>(std::max(info.nFields, 1))),
+      firstPlaceM(nextPlaceG.fetch_add(nKeysM, std::memory_order_relaxed)),
+      vKeysM(static_cast<FieldKey*>(RoxMempool::MallocIn(nullptr, nKeysM * sizeof(FieldKey)))) {
+    new (vKeysM) FieldKey(nullptr);
+    for (uint32_t slot = 0; slot < static_cast<uint32_t>(std::max(info.nFields, 0)); ++slot) {
         const FieldInfo& field = info.vFieldInfo[slot];
-        if (!field.FHole()) namesM.Add(info.FieldName(field), static_cast<uint32_t>(slot));
+        if (field.FHole()) {
+            new (&vKeysM[slot]) FieldKey(nullptr);
+        } else {
+            new (&vKeysM[slot]) FieldKey(info.FieldName(field), &field);
+            namesM.Add(info.FieldName(field), slot);
+        }
     }
+    // Every object has this key, and few structs a field of the name.
+    const std::string_view type = "type";
+    if (vKeysM[0].Field() == nullptr && namesM.Find(NameKey(type)) == noneG) {
+        new (vKeysM) FieldKey(type, nullptr);
+        namesM.Add(type, 0);
+    }
+}
+
+FieldIndex::~FieldIndex() {
+    RoxMempool::FreeIn(nullptr, vKeysM);
 }
 
 FieldIndex* FieldIndex::New(const StructInfo& info) {

@@ -4,6 +4,7 @@
 #include <string_view>
 
 #include "sorn/model/StructInfo.h"
+#include "sorn/typedjson/FieldKey.h"
 #include "sorn/typedjson/NameIndex.h"
 
 namespace sorn {
@@ -22,11 +23,19 @@ class FieldIndex {
     /// itself.
     static void DestroyAll();
 
+    static constexpr uint32_t noneG = NameIndex::noneG;
+
+    /// The slot of a name, or noneG. Slot 0, which has no field, is that of "type", which tells the struct.
+    uint32_t FindSlot(const NameKey& name) const { return namesM.Find(name); }
     /// The field of a name, or null.
     const FieldInfo* Find(const NameKey& name) const {
         const uint32_t slot = namesM.Find(name);
-        return slot != NameIndex::noneG ? &infoM.vFieldInfo[slot] : nullptr;
+        return slot != noneG ? vKeysM[slot].Field() : nullptr;
     }
+    /// The key of a slot; for a slot that is none, of some other.
+    const FieldKey& KeyAt(uint32_t slot) const { return vKeysM[slot < nKeysM ? slot : 0]; }
+    /// Where KeyHints have what comes behind a slot.
+    uint32_t HintPlace(uint32_t slot) const { return firstPlaceM + slot; }
     /// ObjectBudget::SizeOf.
     uint32_t ObjectBytes() const { return nObjectBytesM; }
 
@@ -38,11 +47,14 @@ class FieldIndex {
 
  private:
     explicit FieldIndex(const StructInfo& info);
-    ~FieldIndex() = default;
+    ~FieldIndex();
 
     const StructInfo& infoM;
     NameIndex namesM;
     uint32_t nObjectBytesM;
+    uint32_t nKeysM;       ///< slots, and at least 1
+    uint32_t firstPlaceM;  ///< HintPlace of slot 0
+    FieldKey* vKeysM;
 };
 
 }  // namespace sorn

@@ -17,7 +17,8 @@ ObjectReader::ObjectReader(RoxMempool* pool, InputPointerBytesource& cursor, Obj
       textM(pool),
       skipperM(pool, cursor, objects, wordsM),
       stackM(pool),
-      levelsM(pool) {}
+      levelsM(pool),
+      hintsM(KeyHints::OfThread()) {}
 
 bool ObjectReader::ReadObject(const StructInfo* info, ref<SornObject>& out) {
     if (info == nullptr || objectsM.FNextIsNew()) {
@@ -67,7 +68,7 @@ bool ObjectReader::Finish(bool isGood) {
 }
 
 void ObjectReader::PushCaller(const FieldInfo* field, SornObject* object) {
-    stackM.Push({nullptr, object, field, nullptr, 0, false, false});
+    stackM.Push({nullptr, object, field, nullptr, 0, false, false, 0});
 }
 
 /// Goes on until the lowest frame is gone.
@@ -106,7 +107,7 @@ ref<SornObject> ObjectReader::MakeObject(const StructInfo& info, const FieldInde
 
 void ObjectReader::PushObject(const StructInfo& info, const FieldIndex* index, SornObject* object) {
     wordsM.SetSilent(!stackM.FEmpty());
-    stackM.Emplace(&info, object, nullptr, index, 0u, false, false);
+    stackM.Emplace(&info, object, nullptr, index, 0u, false, false, uint16_t{0});
 }
 
 ObjectReader::Step ObjectReader::StartValue() {

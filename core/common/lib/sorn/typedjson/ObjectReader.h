@@ -15,6 +15,7 @@
 #include "sorn/typedjson/CursorText.h"
 #include "sorn/typedjson/FieldIndex.h"
 #include "sorn/typedjson/InputPointerBytesource.h"
+#include "sorn/typedjson/KeyHints.h"
 #include "sorn/typedjson/ObjectReaderLevels.h"
 #include "sorn/typedjson/ObjectReaderObjects.h"
 #include "sorn/typedjson/ObjectReaderWords.h"
@@ -55,6 +56,7 @@ class ObjectReader {
         uint32_t nLevels;          ///< arrays that are open in its value
         bool isMulti;              ///< how the value under way is taken
         bool isBare;               ///< the caller wants no words about where the value stands
+        uint16_t slot;             ///< of the field that came last, as far as hints go
     };
     enum class Step : uint8_t { OPENED, CLOSED, FAILED };
 
@@ -65,6 +67,7 @@ class ObjectReader {
     void PushObject(const StructInfo& info, const FieldIndex* index, SornObject* object);
     Step ReadMembers(bool fBehindValue);
     Step ReadMember(std::string_view key);
+    const FieldKey* ReadPlainKey(Frame& frame, const unsigned char*& value);
     bool ReadPlainMember(Step& step);
     Step SkipMember(std::string_view key);
     Step StartValue();
@@ -112,6 +115,7 @@ class ObjectReader {
     ObjectSkipper skipperM;
     RoxWorkStack<Frame, 16> stackM;
     ObjectReaderLevels levelsM;
+    KeyHints& hintsM;
     ref<SornObject> outermostM;     ///< the outermost object that was made
     ref<rox::ByteBuffer> noBytesM;  ///< the value of all byte strings without bytes; made for the first
 };

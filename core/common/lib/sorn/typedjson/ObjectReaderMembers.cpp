@@ -10,28 +10,43 @@ namespace {
 
 constexpr const char* noColonG = "JSON field name must be followed by a colon.";
 
-/// Whether a value of the field is one text or token.
-bool FText(const FieldInfo& field) {
-    constexpr uint32_t othersG = 1u << SORN_DATA_TYPE_ANY_DICT | 1u << SORN_DATA_TYPE_KNOWN_DICT |
-                                 1u << SORN_DATA_TYPE_KNOWN_DICT_AS_LAZY | 1u << SORN_DATA_TYPE_OBJECT;
-    return field.arity != SORN_ARITY_MULTI && field.dataType < SORN_DATA_TYPE_NONE &&
-           (othersG >> field.dataType & 1) == 0;
-}
+constexpr FieldKey unknownKeyG(nullptr);
 
 }  // namespace
+
+/// The key that stands at the cursor as programs write it, and where its value begins. Null for another key,
+/// with nothing moved.
+inline const FieldKey* ObjectReader::ReadPlainKey(Frame& frame, const unsigned char*& value) {
+    const unsigned char* const p = cursorM.pCurrentM;
+    const unsigned char* const end = cursorM.pEndM;
+    const FieldIndex& index = *frame.pIndex;
+    uint16_t& hint = hintsM.At(index.HintPlace(frame.slot));
+    const FieldKey& hinted = index.KeyAt(hint);
+    if (end - p > ptrdiff_t{FieldKey::maxBytesG} + plaintext::nBehindG && hinted.FAt(p)) {
+        frame.slot = hint;
+        value = plaintext::ValueOf(p + hinted.Bytes() - 2);
+        return &hinted;
+    }
+    const unsigned char* const keyEnd = plaintext::FindKeyEnd(p, end);
+    if (keyEnd == nullptr) return nullptr;
+    value = plaintext::ValueOf(keyEnd);
+    const uint32_t slot = index.FindSlot(NameKey::OfRoomy(plaintext::View(p + 1, keyEnd)));
+    if (slot == FieldIndex::noneG) return &unknownKeyG;
+    if (slot <= UINT16_MAX) hint = frame.slot = static_cast<uint16_t>(slot);
+    return &index.KeyAt(slot);
+}
 
 /// Reads a member that stands at the cursor as programs write it. False, with nothing moved: another one.
 inline __attribute__((always_inline)) bool ObjectReader::ReadPlainMember(Step& step) {
     Frame& frame = stackM.Top();
-    const unsigned char* const p = cursorM.pCurrentM;
-    const unsigned char* const end = cursorM.pEndM;
-    const unsigned char* const keyEnd = plaintext::FindKeyEnd(p, end);
-    if (keyEnd == nullptr || frame.pIndex == nullptr) return false;
-    const FieldInfo* const field = frame.pIndex->Find(NameKey::OfRoomy(plaintext::View(p + 1, keyEnd)));
-    const unsigned char* const value = plaintext::ValueOf(keyEnd);
+    if (frame.pIndex == nullptr) return false;
+    const unsigned char* value;
+    const FieldKey* const key = ReadPlainKey(frame, value);
+    if (key == nullptr) return false;
+    const FieldInfo* const field = key->Field();
     std::string_view text;
     if (field == nullptr) {
-        const unsigned char* const behind = plaintext::FindText(value, end, text);
+        const unsigned char* const behind = plaintext::FindText(value, cursorM.pEndM, text);
         if (behind == nullptr) return false;
         cursorM.pCurrentM = behind;
         step = Step::CLOSED;
@@ -39,7 +54,8 @@ inline __attribute__((always_inline)) bool ObjectReader::ReadPlainMember(Step& s
     }
     frame.pField = field;
     if (field->arity == SORN_ARITY_OPTIONAL) frame.pObject->SetPresent(*field);
-    const unsigned char* const behind = FText(*field) ? plaintext::FindText(value, end, text) : nullptr;
+    const unsigned char* const behind =
+        key->FText() ? plaintext::FindText(value, cursorM.pEndM, text) : nullptr;
     if (behind == nullptr) {
         cursorM.pCurrentM = value;
         step = StartValue();

@@ -105,13 +105,15 @@ inline bool ObjectSkipper::SkipPlainMembers(bool& fBehindValue) {
     const bool isTypeWanted = frame.number != noNumberG;
     PlainMembers::Member member;
     plainM.Enter(cursorM);
+    if (fBehindValue && plainM.FEnds(p)) return false;
     for (;;) {
         if (fBehindValue) {
-            if (plainM.FEnds(p) || *p != ',') break;
-            p = plainM.BehindComma(p);
+            if (*p != ',') break;
             fBehindValue = false;
+            if (!plainM.ReadBehindComma(p, member)) break;
+        } else if (!plainM.Read(p, member)) {
+            break;
         }
-        if (!plainM.Read(p, member)) break;
         const bool isType =
             isTypeWanted && member.key.size() == 4 && memcmp(member.key.data(), "type", 4) == 0;
         if (member.pBehind == nullptr) {

@@ -57,7 +57,8 @@ uint16_t* ListStops(const Byte* p, unsigned offset, uint16_t* out) {
 
 /// Makes the piece that begins at p.
 void PlainMembers::FindStops(const Byte* p) {
-    const unsigned n = static_cast<unsigned>(std::min<ptrdiff_t>(pEndM - p, nPieceG));
+    const unsigned n =
+        static_cast<unsigned>(std::clamp<ptrdiff_t>(pEndM - p - plaintext::nBehindG, 0, nPieceG));
     pBeginM = p;
     pPieceEndM = p + n;
     uint16_t* out = vStopsM;

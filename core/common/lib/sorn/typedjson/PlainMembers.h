@@ -43,14 +43,18 @@ class PlainMembers {
     bool Read(const Byte* p, Member& member) {
         return ReadInPiece(p, member) || (FEndsPiece(p) && ReadInPiece(p, member));
     }
-    /// Where the next key or element begins, for a p that stands on a comma.
-    const Byte* BehindComma(const Byte* p) const {
-        // Most often it is the next quote: then it need not wait for p.
+    /// The same for the member behind a comma; p, which stands on that, then tells where it begins. It may
+    /// move when there is no plain member, too: over the comma and what is white behind it.
+    bool ReadBehindComma(const Byte*& p, Member& member) {
+        // Most often the key is the next quote: then it need not wait for p.
         const size_t next = *pNextM;
-        if (p[1] == ' ' && Offset(p) + 2 == next) [[likely]]
-            return pBeginM + next;
-        if (Offset(p) + 1 == next) return pBeginM + next;
-        return plaintext::BehindComma(p, pEndM);
+        const size_t comma = Offset(p);
+        if ((comma + 2 == next && p[1] == ' ') || comma + 1 == next) [[likely]] {
+            p = pBeginM + next;
+            return ReadAtStop(member) || (FEndsPiece(p) && ReadInPiece(p, member));
+        }
+        p = plaintext::BehindComma(p, pEndM);
+        return Read(p, member);
     }
     bool FEnds(const Byte* p) const { return pEndM - p <= plaintext::nBehindG; }
 
@@ -59,7 +63,8 @@ class PlainMembers {
     static constexpr uint16_t noneG = UINT16_MAX;
     static constexpr unsigned nAheadG = 4;  ///< stops of one member
 
-    bool ReadInPiece(const Byte* p, Member& member);
+    bool ReadInPiece(const Byte* p, Member& member) { return *pNextM == Offset(p) && ReadAtStop(member); }
+    bool ReadAtStop(Member& member);
     bool FEndsPiece(const Byte* p);
     void FindStops(const Byte* p);
     size_t Offset(const Byte* p) const { return static_cast<size_t>(p - pBeginM); }
@@ -69,23 +74,24 @@ class PlainMembers {
     const Byte* pPieceEndM = nullptr;
     const uint16_t* pNextM = vStopsM;  ///< the first stop that was not passed
     uint32_t blockM = 0;               ///< which block of a source the piece belongs to
-    /// Quotes, backslashes and NULs of the piece, from its begin on, in order; then some of noneG.
+    /// Quotes, backslashes and NULs of the piece, from its begin on, in order; then some of noneG. Behind
+    /// each lie more than nBehindG bytes of the block.
     uint16_t vStopsM[nPieceG + nAheadG];
 };
 
-inline bool PlainMembers::ReadInPiece(const Byte* p, Member& member) {
+/// The member whose key begins at the next stop.
+inline bool PlainMembers::ReadAtStop(Member& member) {
     const uint16_t* const stops = pNextM;
-    if (stops[0] != Offset(p) || stops[1] == noneG) return false;
+    if (stops[1] == noneG) return false;
+    const Byte* const p = pBeginM + stops[0];
     const Byte* const keyEnd = pBeginM + stops[1];
-    if (pEndM - keyEnd <= plaintext::nBehindG) return false;
     if (*p != '"' || keyEnd[0] != '"' || keyEnd[1] != ':') return false;
     member.key = plaintext::View(p + 1, keyEnd);
     const Byte* const value = plaintext::ValueOf(keyEnd);
     member.pValue = value;
     if (*value == '"') {
         const Byte* const textEnd = pBeginM + stops[3];
-        if (stops[2] != Offset(value) || stops[3] == noneG) return false;
-        if (pEndM - textEnd <= plaintext::nBehindG || *textEnd != '"') return false;
+        if (stops[2] != Offset(value) || stops[3] == noneG || *textEnd != '"') return false;
         member.text = plaintext::View(value + 1, textEnd);
         member.pBehind = textEnd + 1;
         pNextM = stops + 4;
@@ -105,7 +111,7 @@ inline bool PlainMembers::ReadInPiece(const Byte* p, Member& member) {
 /// Whether a member at p was refused just since the piece ends in it. Then there is a new piece, which begins
 /// with the member.
 inline bool PlainMembers::FEndsPiece(const Byte* p) {
-    if (p == pBeginM || pPieceEndM == pEndM) return false;
+    if (p == pBeginM || pEndM - pPieceEndM <= plaintext::nBehindG) return false;
     // A look at the first stop, so that a text without quotes costs no piece for each member.
     const bool isWithin = p < pPieceEndM;
     if (isWithin && (*pNextM != Offset(p) || pNextM[nAheadG - 1] != noneG)) return false;

@@ -65,9 +65,13 @@ Integer ReadInteger(std::string_view text) {
 bool BareId(const FieldInfo& field, std::string_view text, std::string_view& bare) {
     const StructInfo* const info = Schema::FindStruct(field.typeRef);
     if (info == nullptr) return false;
-    const std::string_view prefix = info->idPrefix != nullptr ? info->idPrefix : "";
-    if (text.substr(0, prefix.size()) != prefix) return false;
-    bare = text.substr(prefix.size());
+    size_t nPrefix = 0;  // by bytes, for it is short
+    if (info->idPrefix != nullptr) {
+        for (; info->idPrefix[nPrefix] != 0; ++nPrefix) {
+            if (nPrefix == text.size() || text[nPrefix] != info->idPrefix[nPrefix]) return false;
+        }
+    }
+    bare = text.substr(nPrefix);
     return true;
 }
 
