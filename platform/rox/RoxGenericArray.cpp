@@ -8,6 +8,22 @@
 #include "rox/RoxCore.h"
 #include "rox/RoxMempool.h"
 
+namespace {
+
+/// Asks the processor for an object that dies soon: its destructor looks at most of its members.
+void Prefetch(const RoxCore* object) {
+    if (object == nullptr) {
+        return;
+    }
+    constexpr unsigned nLines = 8;
+    constexpr unsigned nLine = 64;
+    for (unsigned i = 0; i < nLines; ++i) {
+        __builtin_prefetch(reinterpret_cast<const char*>(object) + i * nLine, 1);
+    }
+}
+
+}  // namespace
+
 RoxGenericArray::RoxGenericArray(RoxGenericArray&& other) noexcept
     : pDataM(std::exchange(other.pDataM, nullptr)),
       pMempoolM(other.pMempoolM),
@@ -77,7 +93,11 @@ void RoxGenericArray::Destroy() {
     RoxCore** data = std::exchange(pDataM, nullptr);
     unsigned n = std::exchange(countM, uint16_t{0});
     capacityM = 0;
+    constexpr unsigned nAhead = 2;
     for (unsigned i = 0; i < n; ++i) {
+        if (i + nAhead < n) {
+            Prefetch(data[i + nAhead]);
+        }
         RoxCore::DownRef(data[i]);
     }
     RoxMempool::FreeIn(pMempoolM, data);
