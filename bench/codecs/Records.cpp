@@ -63,12 +63,14 @@ Records::Records(std::string name, const Bodies& bodies) : nameM(std::move(name)
 
 Record Records::MakeRecord(const std::string& body) {
     Record record;
-    record.object = ObjectOf(body, poolM);
     Sorn ours(poolM);
-    record.binary = ours.ToBinary(record.object);
-    record.text = ours.ToText(record.object);
+    const ref<sorn::SornObject> object = ObjectOf(body, poolM);
+    record.binary = ours.ToBinary(object);
+    record.text = ours.ToText(object);
+    record.object = Sorn(treesM).FromBinary(record);
     const std::string bytes = BytesOf(record.binary);
 
+    CheckObject(ours, record.object, bytes, "the record", body);
     CheckObject(ours, ours.FromBinary(record), bytes, "binary", body);
     CheckObject(ours, ours.FromText(record), bytes, "text", body);
     rapidjson::Document document;

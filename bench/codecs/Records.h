@@ -14,10 +14,10 @@ namespace bench {
 
 /// One record in all forms that the libraries read.
 struct Record {
-    ref<sorn::SornObject> object;
-    ref<rox::ByteBuffer> binary;  ///< the same bytes for all libraries
-    std::string text;             ///< the typed writer's, the same for all but libprotobuf
-    std::string peerText;         ///< libprotobuf's own JSON of the same record
+    ref<sorn::SornObject> object;  ///< as the binary reader makes it, like the peers' trees
+    ref<rox::ByteBuffer> binary;   ///< the same bytes for all libraries
+    std::string text;              ///< the typed writer's, the same for all but libprotobuf
+    std::string peerText;          ///< libprotobuf's own JSON of the same record
 };
 
 /// A set of records. All forms of each are checked against each other when it is made: the process ends with
@@ -38,6 +38,7 @@ class Records {
 
     std::string nameM;
     RoxMempool poolM{"records"};
+    RoxMempool treesM{"trees"};  ///< of the objects alone, as the peers' trees have their arena
     std::vector<Record> recordsM;
     size_t nBinaryM = 0;
     size_t nTextM = 0;
