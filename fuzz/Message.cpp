@@ -10,6 +10,7 @@
 #include "fuzz/support/FuzzPool.h"
 #include "kelbaselib/InMemoryBytestream.h"
 #include "sorn/dict/ByteBuffer.h"
+#include "sorn/dict/RoxByteBuffer.h"
 #include "sorn/lazy/LazyDict.h"
 #include "sorn/rpc/OrvoRpcV2.h"
 #include "sorn/rpc/RequestWrapper.h"
