@@ -59,8 +59,10 @@ class VkLocalorvoClient : public RoxCore {
 
     /// No response is expected; one that comes is dropped.
     bool SendRequestAndForget(sorn::SornObject* object);
-    /// Waits up to 5 seconds for the one response. True does not promise one: look at `response`, too, which
-    /// is as it was when what came in the wait was something else. A response that comes later is dropped.
+    /// Waits up to 5 seconds for the one response, after connecting where that is needed, for which a service
+    /// that takes a connection and never answers may take as long each time it is tried. True does not
+    /// promise one: look at `response`, too, which is as it was when what came in the wait was something
+    /// else. A response that comes later is dropped.
     bool SendRequestSync(sorn::SornObject* object, ref<sorn::LazyDict>& response);
     /// The same; the response as an object, of type "error" when it does not convert. Null without a
     /// response.

@@ -38,7 +38,9 @@ void BusLink::Close() {
         return;
     }
     pollerM.Unwatch(fdM);
-    shutdown(fdM, SHUT_RDWR);  // a child process may hold a copy of it
+    if (pollerM.FOurs()) {
+        shutdown(fdM, SHUT_RDWR);  // a child process may hold a copy of it
+    }
     for (sd_bus_message* message : std::exchange(arrivedM, {})) {
         sd_bus_message_unref(message);
     }

@@ -43,7 +43,7 @@ class BusLink {
     int Fd() const { return fdM; }
 
     /// Whether there may be something to receive that the socket does not show.
-    bool FMoreToReceive() const { return !arrivedM.empty() || fMayHaveMoreM; }
+    bool FMoreToReceive() const { return !arrivedM.empty() || fMayHaveMoreM || fBrokenM; }
 
  private:
     static int OnMessage(sd_bus_message* message, void* link, sd_bus_error*);

@@ -1,5 +1,6 @@
 #include "vkbus/BusListener.h"
 
+#include <poll.h>
 #include <sys/epoll.h>
 #include <sys/socket.h>
 
@@ -57,9 +58,23 @@ void BusListener::OnConnect() {
 }
 
 bool BusListener::FRoomFor(pid_t process) const {
-    const auto nOfProcess = std::count_if(processesM.begin(), processesM.end(),
-                                          [process](const auto& each) { return each.second == process; });
-    return sessionsM.size() < maxVkBusSessionsG && nOfProcess < maxVkBusSessionsOfProcessG;
+    const auto isOf = [process](const auto& each) { return each.second == process; };
+    const auto nOfProcess = std::count_if(processesM.begin(), processesM.end(), isOf);
+    return sessionsM.size() < maxVkBusSessionsG &&
+           (nOfProcess < maxVkBusSessionsOfProcessG || NInUse(process) < maxVkBusSessionsOfProcessG);
+}
+
+// Sessions of a process that it has not left: some that are left still have events to be served.
+unsigned BusListener::NInUse(pid_t process) const {
+    unsigned n = 0;
+    for (const auto& [handle, session] : sessionsM) {
+        const auto found = processesM.find(handle);
+        if (found != processesM.end() && found->second == process) {
+            pollfd socket = {session->Fd(), POLLRDHUP, 0};
+            n += poll(&socket, 1, 0) == 0;
+        }
+    }
+    return n;
 }
 
 // A socket that nobody is accepted from would be ready all the time.
@@ -111,5 +126,7 @@ void BusListener::SetTimer() {
 void BusListener::OnClose() {
     pollerM.Unwatch(listeningM.Get());
     listeningM.Close();
-    addressM.Remove();
+    if (pollerM.FOurs()) {
+        addressM.Remove();
+    }
 }

@@ -18,6 +18,7 @@ class BusListener : public BusEndpoint {
     void OnTimer() override;
     void OnClose() override;
     bool FRoomFor(pid_t process) const;
+    unsigned NInUse(pid_t process) const;
     void Pause();
     void Resume();
     void SetTimer();

@@ -8,6 +8,7 @@
 #include "rox/RoxMonotonicTime.h"
 
 bool BusPoller::Open() {
+    processM = getpid();
     epollM = BusFd(epoll_create1(EPOLL_CLOEXEC));
     wakeM = BusFd(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK));
     return epollM.FOpen() && wakeM.FOpen() && Watch(wakeM.Get(), EPOLLIN, wokenG);
@@ -17,30 +18,32 @@ bool BusPoller::Watch(int fd, uint32_t events, uint64_t tag) {
     epoll_event event = {};
     event.events = events;
     event.data.u64 = tag;
-    return epoll_ctl(epollM.Get(), EPOLL_CTL_ADD, fd, &event) == 0;
+    return FOurs() && epoll_ctl(epollM.Get(), EPOLL_CTL_ADD, fd, &event) == 0;
 }
 
 void BusPoller::Rewatch(int fd, uint32_t events, uint64_t tag) {
     epoll_event event = {};
     event.events = events;
     event.data.u64 = tag;
-    RoxAssert(epoll_ctl(epollM.Get(), EPOLL_CTL_MOD, fd, &event) == 0,
+    RoxAssert(!FOurs() || epoll_ctl(epollM.Get(), EPOLL_CTL_MOD, fd, &event) == 0,
               "bus: a watched socket is not watched");
 }
 
 void BusPoller::Unwatch(int fd) {
-    epoll_ctl(epollM.Get(), EPOLL_CTL_DEL, fd, nullptr);
+    if (FOurs()) {
+        epoll_ctl(epollM.Get(), EPOLL_CTL_DEL, fd, nullptr);
+    }
 }
 
 void BusPoller::Wake() {
-    if (!fWokenM) {
+    if (!fWokenM && FOurs()) {
         fWokenM = true;
         eventfd_write(wakeM.Get(), 1);
     }
 }
 
 void BusPoller::ClearWake() {
-    if (fWokenM) {
+    if (fWokenM && FOurs()) {
         fWokenM = false;
         eventfd_t count;
         eventfd_read(wakeM.Get(), &count);
@@ -48,6 +51,9 @@ void BusPoller::ClearWake() {
 }
 
 bool BusPoller::SetTimer(int64_t nanoseconds) {
+    if (!FOurs()) {
+        return false;
+    }
     if (!timerM.FOpen()) {
         timerM = BusFd(timerfd_create(CLOCK_MONOTONIC, TFD_CLOEXEC | TFD_NONBLOCK));
         if (!timerM.FOpen() || !Watch(timerM.Get(), EPOLLIN, timerG)) {

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <unistd.h>
+
 #include <cstdint>
 
 #include "vkbus/BusDeadline.h"
@@ -17,6 +19,9 @@ class BusPoller {
 
     /// False when the process has no descriptors left.
     bool Open();
+    /// Whether this is the process that has opened it. A child shares the descriptors with its parent, whose
+    /// watches and whose sockets are none of its business: there all but Wait does nothing.
+    bool FOurs() const { return processM == getpid(); }
     /// Readable when something is there to be served.
     int SelectFd() const { return epollM.Get(); }
 
@@ -42,6 +47,7 @@ class BusPoller {
     BusFd epollM;
     BusFd wakeM;
     BusFd timerM;
+    pid_t processM = 0;
     bool fWokenM = false;
     BusPatience patienceM;
 };

@@ -12,6 +12,9 @@
 // none. A handle that is closed or was never given out makes an operation fail with VK_BUS_NO_HANDLE,
 // whatever other threads do meanwhile.
 //
+// A child process has nothing of its parent's: it may close what it finds, which the parent does not notice,
+// and opens its own.
+//
 // Operations may be called from any thread, out of callbacks too; they hold no lock while they wait or call
 // back. Events of one connection are delivered in their order as long as one thread at a time processes it.
 
@@ -44,7 +47,8 @@ constexpr uint32_t maxVkBusEventBytesG = 8u << 20;
 /// counts for vkBusEventOverheadG more than it has.
 constexpr uint32_t maxVkBusQueuedBytesG = 16u << 20;
 constexpr uint32_t vkBusEventOverheadG = 1024;
-/// Most sessions of a listener, and of one process with it; further ones are closed at once.
+/// Most sessions of a listener, and of one process with it; further ones are closed at once. Processes in
+/// containers, whose numbers are not ours, count as one.
 constexpr unsigned maxVkBusSessionsG = 256;
 constexpr unsigned maxVkBusSessionsOfProcessG = 32;
 /// Nanoseconds that the opening of a session may take, at either end.

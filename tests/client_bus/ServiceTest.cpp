@@ -1,3 +1,5 @@
+#include <malloc.h>
+
 #include "ClientBusFixture.h"
 #include "client/BusTypeLibrary.h"
 
@@ -47,6 +49,25 @@ TEST_F(ServiceTest, BodiesOutliveTheConnection) {
         const RoxString json = bodies[i]->ToJson(false);
         EXPECT_TRUE(json.View() == wanted) << json.View().substr(0, 100);
     }
+}
+
+/// A few bytes of response with a lot behind them, which nobody reads: the bodies hold no more than they are.
+TEST_F(ServiceTest, WhatStandsBehindAResponseIsNotHeld) {
+    constexpr size_t nBehind = 4 << 20;
+    Service service([](const Request& request) {
+        Service::SendText(request.session, Service::ResponseText(request.rpcId, true, request.body) +
+                                               std::string(nBehind, '\n'));
+    });
+    const ref<VkLocalorvoClient> client = VkLocalorvoClient::Get();
+    std::vector<ref<sorn::LazyDict>> bodies(10);
+    const size_t nBefore = mallinfo2().uordblks + mallinfo2().hblkhd;
+    const size_t nPoolBefore = pool.GetUsedBytes();
+    for (ref<sorn::LazyDict>& each : bodies) {
+        ASSERT_TRUE(client->SendRequestSync(Object().get(), each));
+        ASSERT_NE(nullptr, each);
+    }
+    EXPECT_LT(pool.GetUsedBytes() - nPoolBefore, nBehind);
+    EXPECT_LT(mallinfo2().uordblks + mallinfo2().hblkhd, nBefore + 3 * nBehind);
 }
 
 /// Each replaces the one before, for which nobody came.

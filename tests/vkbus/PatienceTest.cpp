@@ -69,7 +69,7 @@ TEST_F(PatienceOnTheBus, AWaitSleepsWhenNothingComes) {
     }
     const int64_t start = ThreadNanoseconds();
     EXPECT_EQ(VK_BUS_TIMED_OUT, client.Process(300'000'000));
-    EXPECT_LT(ThreadNanoseconds() - start, 100'000'000);
+    EXPECT_LT(ThreadNanoseconds() - start, 20'000'000);
 }
 
 }  // namespace

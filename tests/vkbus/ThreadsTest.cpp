@@ -253,6 +253,53 @@ TEST_F(Threads, ChildThatHoldsCopiesKeepsNothingOpen) {
     EXPECT_EQ(0, status);
 }
 
+// What a child closes is still open in its parent.
+TEST_F(Threads, ChildThatClosesDisturbsNobody) {
+    Service service;
+    Client client;
+    EXPECT_EQ("x", client.RoundTrip("x"));
+    for (int i = 0; i < 3; ++i) {
+        // A lock that the service's thread held now would be held in the child for ever.
+        std::this_thread::sleep_for(std::chrono::milliseconds(100));
+        const pid_t child = fork();
+        if (child == 0) {
+            alarm(30);
+            VkBusCloseSession(client.session);
+            VkBusCloseAll();
+            _exit(CountInProc("fd") <= 3 + 1 ? 0 : 1);
+        }
+        int status = 1;
+        ASSERT_EQ(child, waitpid(child, &status, 0));
+        EXPECT_TRUE(WIFEXITED(status));
+        EXPECT_EQ("still there", client.RoundTrip("still there"));
+    }
+    EXPECT_EQ("the service, too", Client().RoundTrip("the service, too"));
+    EXPECT_TRUE(WaitUntil([&] { return service.nClosed == 1; })) << "that one";
+    EXPECT_EQ("still there", client.RoundTrip("still there"));
+}
+
+// All who wait for a connection come back when it is closed.
+TEST_F(Threads, FiveWaitersOfAConnectionThatIsClosed) {
+    Service service;
+    Client client;
+    std::atomic<int> nBack{0};
+    std::vector<std::thread> waiters;
+    for (int i = 0; i < 5; ++i) {
+        waiters.emplace_back([&] {
+            EXPECT_NE(VK_BUS_DONE, client.Process(patienceG));
+            ++nBack;
+        });
+    }
+    std::this_thread::sleep_for(std::chrono::milliseconds(100));
+    const auto start = std::chrono::steady_clock::now();
+    EXPECT_EQ(VK_BUS_DONE, VkBusCloseConnection(client.connection));
+    for (std::thread& each : waiters) {
+        each.join();
+    }
+    EXPECT_EQ(5, nBack);
+    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::nanoseconds(patienceG / 2));
+}
+
 TEST_F(Threads, SignalsDoNotDisturb) {
     struct sigaction action = {};
     action.sa_handler = [](int) {};
