@@ -59,7 +59,7 @@ void BusListener::OnConnect() {
 
 bool BusListener::FRoomFor(pid_t process) const {
     const auto isOf = [process](const auto& each) { return each.second == process; };
-    const auto nOfProcess = std::count_if(processesM.begin(), processesM.end(), isOf);
+    const auto nOfProcess = static_cast<size_t>(std::count_if(processesM.begin(), processesM.end(), isOf));
     return sessionsM.size() < maxVkBusSessionsG &&
            (nOfProcess < maxVkBusSessionsOfProcessG || NInUse(process) < maxVkBusSessionsOfProcessG);
 }
