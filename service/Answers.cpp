@@ -1,5 +1,6 @@
 #include "service/Answers.h"
 
+#include "service/Utf8Words.h"
 #include "sorn/dict/ByteBuffer.h"
 #include "sorn/dict/RoxByteBuffer.h"
 #include "sorn/lazy/LazyDict.h"
@@ -45,7 +46,7 @@ void Answers::SendError(uint32_t session, uint32_t rpcId, const Failure& failure
     const ref<SornObject> object = sornschema::Error::Factory(&poolM);
     auto& error = static_cast<sornschema::Error&>(*object);
     error.code = failure.code;
-    error.text = ToText(poolM, std::string_view(failure.text).substr(0, maxWordsBytesG));
+    error.text = ToText(poolM, Utf8Words(failure.text, maxWordsBytesG));
     SendMessage(session, ResponseWrapper::New(&poolM, rpcId, true, object, OrvoVersion(), nullptr));
 }
 

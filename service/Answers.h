@@ -23,7 +23,7 @@ class Answers {
     void SendText(uint32_t session, uint32_t rpcId, bool isFinal, std::string_view text);
     /// A record of type "success" as the final response.
     void SendSuccess(uint32_t session, uint32_t rpcId);
-    /// A record of type "error" as the final response.
+    /// A record of type "error" as the final response. Its words are UTF-8, whatever bytes they quote.
     void SendError(uint32_t session, uint32_t rpcId, const Failure& failure);
 
  private:

@@ -54,6 +54,8 @@ class Records {
     bool BeginBatch(Failure& failure);
     bool EndBatch(Failure& failure);
     void DropBatch();
+    /// Whether a failure of the store has ended the batch already.
+    bool FBatchLost() const { return storeM.FBatchLost(); }
 
     /// Calls `take` with the numbers of the records of a type that meet the conditions, in the order of their
     /// insertion, until it gives false.

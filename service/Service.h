@@ -40,6 +40,8 @@ class Service {
     /// Loads between them are stored together. EndLoad gives false and words when none of them was.
     bool BeginLoad(Failure& failure) { return recordsM.BeginBatch(failure); }
     bool EndLoad(Failure& failure) { return recordsM.EndBatch(failure); }
+    /// Whether a failure of the store between them has undone all of them already: further ones fail, too.
+    bool FLoadLost() const { return recordsM.FBatchLost(); }
 
     size_t CountStreams() const { return streamsM.Count(); }
 

@@ -42,9 +42,7 @@ ServiceLoop::ServiceLoop(Store& store, const Limits& limits, Observer observer)
                    if (observerM) observerM(message);
                    busM.Send(session, message);
                }),
-      stopM(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {
-    BlockSignals();
-}
+      stopM(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {}
 
 ServiceLoop::~ServiceLoop() {
     onBusM.reset();
@@ -53,6 +51,7 @@ ServiceLoop::~ServiceLoop() {
 }
 
 bool ServiceLoop::Listen(const std::string& address, std::string& words) {
+    BlockSignals();  // before there is a socket to be left behind
     return busM.Listen(address, words);
 }
 

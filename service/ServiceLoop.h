@@ -13,8 +13,8 @@ struct sd_event_source;
 
 namespace sorn::service {
 
-/// A service on the bus with the loop that runs it until SIGINT or SIGTERM, which are blocked for the thread
-/// from its making on. One thread.
+/// A service on the bus with the loop that runs it until SIGINT or SIGTERM. Listen blocks these for the
+/// thread, so that none is lost on the way to Run; before, they do what they always do. One thread.
 class ServiceLoop {
  public:
     /// Is told of each message of each session as it comes and goes; may be null.

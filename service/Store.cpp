@@ -31,6 +31,14 @@ constexpr char removeG[] = "DELETE FROM record WHERE number = ?";
 constexpr char listG[] = "SELECT number, version FROM record WHERE type = ? ORDER BY number";
 constexpr char readG[] = "SELECT body FROM record WHERE number = ?";
 
+constexpr char inMemoryG[] = ":memory:";
+
+/// SQLite finds more than files behind some names, but not behind those with a folder.
+std::string NameOf(const std::string& path) {
+    if (path.empty()) return inMemoryG;
+    return path.front() == '/' ? path : "./" + path;
+}
+
 /// Makes the file for us alone, if it is not there.
 void Touch(const std::string& path) {
     const int descriptor = ::open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600);
@@ -83,11 +91,15 @@ void Store::EndStatement::operator()(sqlite3_stmt* statement) const {
 }
 
 std::unique_ptr<Store> Store::Open(const std::string& path, int64_t maxBytes, std::string& words) {
+    if (path == inMemoryG) {
+        words = "not a name for a file; without one the store is in memory";
+        return nullptr;
+    }
     std::unique_ptr<Store> store(new Store);
     if (!path.empty()) Touch(path);
     sqlite3* database = nullptr;
     const int flags = SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE | SQLITE_OPEN_NOMUTEX;
-    const int result = sqlite3_open_v2(path.empty() ? ":memory:" : path.c_str(), &database, flags, nullptr);
+    const int result = sqlite3_open_v2(NameOf(path).c_str(), &database, flags, nullptr);
     store->databaseM.reset(database);
     if (result == SQLITE_OK && !store->Check(words)) return nullptr;
     if (result == SQLITE_OK && store->SetUp(maxBytes)) return store;
@@ -168,15 +180,19 @@ bool Store::Fail(Failure& failure) {
 }
 
 /// SQLite ends a transaction when memory or disk fails it; what follows would be stored on its own.
-bool Store::FBatchLost(Failure& failure) const {
-    if (!isBatchM || sqlite3_get_autocommit(databaseM.get()) == 0) return false;
+bool Store::FBatchLost() const {
+    return isBatchM && sqlite3_get_autocommit(databaseM.get()) != 0;
+}
+
+bool Store::FBatchLostBy(Failure& failure) const {
+    if (!FBatchLost()) return false;
     failure = lossM;
     return true;
 }
 
 Store::Stored Store::Put(std::string_view type, std::string_view key, int version, std::string_view text,
                          int64_t& number, Failure& failure) {
-    if (FBatchLost(failure)) return FAILED;
+    if (FBatchLostBy(failure)) return FAILED;
     Statement find(findM);
     const int result = find.Bind(type).Bind(key).Step();
     if (result != SQLITE_ROW && result != SQLITE_DONE) return Fail(failure), FAILED;
@@ -226,14 +242,14 @@ bool Store::Read(int64_t number, const std::function<void(std::string_view)>& ta
 }
 
 bool Store::Begin(Failure& failure) {
-    if (FBatchLost(failure)) return false;
+    if (FBatchLostBy(failure)) return false;
     if (!Run("BEGIN IMMEDIATE")) return Fail(failure);
     isBatchM = true;
     return true;
 }
 
 bool Store::Commit(Failure& failure) {
-    if (!FBatchLost(failure)) {
+    if (!FBatchLostBy(failure)) {
         if (Run("COMMIT")) {
             isBatchM = false;
             return true;

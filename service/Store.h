@@ -28,7 +28,7 @@ class Store {
     enum Stored { FAILED, INSERTED, REPLACED };
 
     /// Opens or makes the file; an empty path is a store in memory. Null and words for a file of another
-    /// program or of another format, or one that is in use. It takes up to maxBytes.
+    /// program or of another format, one that is in use, and the path ":memory:". It takes up to maxBytes.
     static std::unique_ptr<Store> Open(const std::string& path, int64_t maxBytes, std::string& words);
     ~Store();
     Store(const Store&) = delete;
@@ -49,6 +49,8 @@ class Store {
     bool Begin(Failure& failure);
     bool Commit(Failure& failure);
     void Rollback();
+    /// Whether such a failure has ended the batch that has begun.
+    bool FBatchLost() const;
 
  private:
     class Statement;
@@ -68,7 +70,7 @@ class Store {
     bool Run(const char* sql);
     int64_t Number(const char* sql);
     bool Fail(Failure& failure);
-    bool FBatchLost(Failure& failure) const;
+    bool FBatchLostBy(Failure& failure) const;
 
     std::unique_ptr<sqlite3, CloseDatabase> databaseM;
     Prepared findM;

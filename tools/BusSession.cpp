@@ -1,5 +1,8 @@
 #include "tools/BusSession.h"
 
+#include <chrono>
+#include <utility>
+
 #include "client/BusTypeLibrary.h"
 #include "sorn/dict/ByteBuffer.h"
 #include "sorn/rpc/OrvoRpcV2.h"
@@ -10,7 +13,11 @@ namespace sorn::tools {
 
 namespace {
 constexpr int64_t waitLimitG = 5'000'000'000;  // nanoseconds
+
+int64_t Now() {
+    return std::chrono::nanoseconds(std::chrono::steady_clock::now().time_since_epoch()).count();
 }
+}  // namespace
 
 BusSession::~BusSession() {
     if (sessionM != 0) VkBusCloseSession(sessionM);
@@ -59,13 +66,24 @@ ref<ResponseWrapper> BusSession::Exchange(const ref<OrvoRpcWrapper>& message, st
     }
     if (isTracedM) TraceMessage(true, reinterpret_cast<const char*>(text.GetData()), text.GetLength());
     const VkAesRequest record = {{text.GetLength(), text.GetData()}};
-    unsigned result = VkBusMarshalAndSend(sessionM, VkAesRequest::idG, &record);
+    const int64_t deadline = Now() + waitLimitG;
     responseM = nullptr;
-    while (result == 0 && (responseM == nullptr || responseM->GetRpcId() != message->GetRpcId())) {
-        result = VkBusProcessOneEvent(connectionM, &waitLimitG);
+    unsigned result = VkBusMarshalAndSend(sessionM, VkAesRequest::idG, &record);
+    if (result == 0) result = WaitFor(message->GetRpcId(), deadline);
+    if (result == 0) return responseM;
+    words = VkBusResultText(result);
+    VkBusCloseSession(std::exchange(sessionM, 0));
+    return nullptr;
+}
+
+unsigned BusSession::WaitFor(uint32_t rpcId, int64_t deadline) {
+    while (responseM == nullptr || responseM->GetRpcId() != rpcId) {
+        const int64_t limit = deadline - Now();
+        if (limit <= 0) return VK_BUS_TIMED_OUT;
+        const unsigned result = VkBusProcessOneEvent(connectionM, &limit);
+        if (result != VK_BUS_DONE) return result;
     }
-    if (result != 0) words = VkBusResultText(result);
-    return result == 0 ? responseM : nullptr;
+    return VK_BUS_DONE;
 }
 
 }  // namespace sorn::tools

@@ -24,12 +24,14 @@ class BusSession {
     /// Connects to the address that VkBusSetAddress has set; false and words.
     bool Open(std::string& words);
     bool FOpen() const { return sessionM != 0; }
-    /// Sends a message and waits for the response with its number, 5 seconds at most; null and words.
+    /// Sends a message and waits for the response with its number, 5 seconds at most, whatever else comes
+    /// meanwhile; null and words. When it was the bus that failed, the session is over, too.
     ref<ResponseWrapper> Exchange(const ref<OrvoRpcWrapper>& message, std::string& words);
 
  private:
     static unsigned OnEvent(uint32_t session, uintptr_t word1, uintptr_t word2, void* self);
     static void OnClosed(uint32_t session, uintptr_t reason, void* self);
+    unsigned WaitFor(uint32_t rpcId, int64_t deadline);
 
     RoxMempool* poolM;
     bool isTracedM;

@@ -26,9 +26,14 @@ bool LineReader::Refill() {
         n = ::read(descriptorM, vPieceM.data(), vPieceM.size());
     } while (n < 0 && errno == EINTR);
     fFailedM = n < 0;
+    if (fFailedM) errorM = errno;
     nextM = 0;
     endM = fFailedM ? 0 : static_cast<size_t>(n);
     return endM != 0;
+}
+
+std::string LineReader::FailureWords() const {
+    return errorM != 0 ? std::strerror(errorM) : "a record is 4 GiB or longer";
 }
 
 bool LineReader::Take(size_t n, std::string& text) {

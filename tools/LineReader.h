@@ -23,6 +23,8 @@ class LineReader {
     bool ReadAll(std::string& text);
     /// Whether reading failed, or a record is longer than maxRecordBytesG.
     bool FFailed() const { return fFailedM; }
+    /// Words about that, after FFailed.
+    std::string FailureWords() const;
 
  private:
     /// The next piece; false at the end or on failure.
@@ -35,6 +37,7 @@ class LineReader {
     size_t nextM = 0;
     size_t endM = 0;
     bool fFailedM = false;
+    int errorM = 0;  // of the system, when reading failed
 };
 
 }  // namespace sorn::tools

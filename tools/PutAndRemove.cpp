@@ -12,6 +12,7 @@
 #include "tools/LineReader.h"
 #include "tools/MessageLine.h"
 #include "tools/Output.h"
+#include "tools/Words.h"
 #include "vkbus/VkBus.h"
 
 namespace sorn::tools {
@@ -56,8 +57,10 @@ bool TellAll(const PutAndRemoveOptions& options, LineReader& reader) {
         if (line.find_first_not_of(" \t\r") == std::string::npos) continue;
         if (Tell(session, &sessionPool, number, options.action, line, words)) continue;
         isAllDone = false;
-        std::fprintf(stderr, "line %u: %s\n", number, words.c_str());
+        std::fprintf(stderr, "line %u: %s%s\n", number, LineOfWords(words).c_str(),
+                     session.FOpen() ? "" : "; the rest was not sent");
     }
+    if (reader.FFailed()) std::fprintf(stderr, "the input: %s\n", reader.FailureWords().c_str());
     return isAllDone && !reader.FFailed();
 }
 

@@ -13,7 +13,8 @@ struct PutAndRemoveOptions {
 };
 
 /// Takes the records of the input, one a line, to the development service, each in a request of its own;
-/// gives an ExitCode. What is refused is told on standard error, and the rest is done.
+/// gives an ExitCode. What is refused is told on standard error, and the rest is done; after an
+/// answer that does not come nothing more is sent.
 int PutOrRemove(const PutAndRemoveOptions& options);
 
 }  // namespace sorn::tools

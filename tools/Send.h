@@ -15,8 +15,8 @@ struct SendOptions {
 };
 
 /// Sends one request through the client and writes the bodies of its responses, a line each, to standard
-/// output; gives an ExitCode. Watching ends with the last response, with SIGINT or SIGTERM, or when the
-/// connection is lost.
+/// output; gives an ExitCode. Watching ends with the last response, with SIGINT or SIGTERM, whether or
+/// not somebody reads the output, or when the connection is lost.
 int Send(const SendOptions& options);
 
 }  // namespace sorn::tools

@@ -13,8 +13,9 @@ struct ServeOptions {
     bool trace = false;               ///< every message to standard output
 };
 
-/// Runs the development service until SIGINT or SIGTERM; gives an ExitCode: done, too, when lines of files
-/// were refused, which standard error tells. It says "listening on" and the address on standard error as soon
+/// Runs the development service until SIGINT or SIGTERM, which end the process at once while files are
+/// loaded; gives an ExitCode: done, too, when lines of files were refused, which standard error tells, but
+/// not when a file could not be read. It says "listening on" and the address on standard error as soon
 /// as clients can connect.
 int Serve(const ServeOptions& options);
 

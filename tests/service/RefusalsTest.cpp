@@ -102,6 +102,36 @@ const GarbageRow vGarbageRowsG[] = {
     {Framed("RpcId: 9\r\nno colon\r\n", "{}"), 9},
 };
 
+/// The words of the refusal to remove by a name that is no field's.
+std::string WordsAbout(const ResponseText& answer) {
+    const std::string begin = "\"text\": \"recording has no field '";
+    const size_t found = answer.body.find(begin);
+    if (found == std::string::npos) return "no such words: " + answer.body;
+    const size_t start = found + begin.size();
+    return answer.body.substr(start, answer.body.find('"', start) - start);
+}
+
+TEST_F(RefusalsTest, WordsAreCutBetweenCharacters) {
+    std::string name = "x";
+    std::string all = "x";
+    for (int i = 0; i < 3000; ++i) name += "\u00E4";
+    // 4,096 bytes less the 24 before the name and its first one: half of a character would fit, too.
+    for (int i = 0; i < 2035; ++i) all += "\u00E4";
+    EXPECT_EQ(WordsAbout(Ask(
+                  {1, "recording", "{\"type\": \"recording\", \"" + name + "\": 1}", "single", "remove"})),
+              all);
+}
+
+TEST_F(RefusalsTest, WordsAreUtf8WhateverTheyQuote) {
+    EXPECT_EQ(WordsAbout(Ask({1, "recording",
+                              "{\"type\": \"recording\", \"a\xFF"
+                              "b\xE4\xB8\u00E4\xC0\x80\": 1}",
+                              "single", "remove"})),
+              "a?b?"
+              "?\u00E4?"
+              "?'");
+}
+
 TEST_F(RefusalsTest, GarbageIsAnswered) {
     for (const GarbageRow& row : vGarbageRowsG) {
         const ResponseText answer = Ask(row.message);

@@ -158,6 +158,13 @@ TEST_F(StoreTest, RefusesFilesOfOthers) {
     EXPECT_EQ(words, "unable to open database file");
 }
 
+TEST_F(StoreTest, RefusesANameThatStandsForMemory) {
+    path = ":memory:";
+    EXPECT_EQ(Open(), nullptr);
+    EXPECT_EQ(words, "not a name for a file; without one the store is in memory");
+    EXPECT_FALSE(std::filesystem::exists(path));
+}
+
 TEST_F(StoreTest, OneProcessAtATime) {
     const auto store = Open();
     ASSERT_NE(store, nullptr) << words;
@@ -184,12 +191,15 @@ TEST_F(StoreTest, ABatchThatDoesNotFitIsNotStoredInPart) {
         Failure failure;
         ASSERT_TRUE(store->Begin(failure));
         EXPECT_NE(Put(*store, "a", "1", "one"), 0);
+        EXPECT_FALSE(store->FBatchLost());
         EXPECT_EQ(Put(*store, "a", "2", std::string(2'000'000, 'x')), 0);
+        EXPECT_TRUE(store->FBatchLost());
         EXPECT_EQ(Put(*store, "a", "3", "three"), 0) << "it would be stored on its own";
         EXPECT_FALSE(store->Commit(failure));
         EXPECT_EQ(failure.code, ErrorCode::resourceUnavailableG);
         EXPECT_EQ(failure.text, "the store is full");
         EXPECT_EQ(All(*store, "a"), "");
+        EXPECT_FALSE(store->FBatchLost());
         ASSERT_TRUE(store->Begin(failure)) << "the next batch is another one";
         EXPECT_NE(Put(*store, "a", "4", "four"), 0);
         EXPECT_TRUE(store->Commit(failure));

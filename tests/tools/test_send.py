@@ -1,14 +1,17 @@
 """sorn send, put and rm against a development service."""
 
 import json
+import select
 import signal
 import subprocess
 import tempfile
 import threading
+import time
 import unittest
 from pathlib import Path
 
 from tools.command import DONE, SOME_REFUSED, TOOL, WRONG_USAGE, run
+from tools.relay import Relay, cut_message
 from tools.service import PATIENCE, SEARCH, Service, recording, recording_list
 
 
@@ -18,6 +21,7 @@ class WithService(unittest.TestCase):
         self.addCleanup(folder.cleanup)
         self.bus = str(Path(folder.name, "bus"))
         self.nowhere = str(Path(folder.name, "nowhere"))
+        self.relay = str(Path(folder.name, "relay"))
         self.service = Service(self.bus)
         self.service.__enter__()
         self.addCleanup(self.service.__exit__)
@@ -62,8 +66,8 @@ class Send(WithService):
 
 
 class Watch(WithService):
-    def watching(self, *arguments):
-        tool = subprocess.Popen([*TOOL, "send", "--bus", self.bus, "--watch", *arguments], stdin=subprocess.PIPE,
+    def watching(self, *arguments, bus=None):
+        tool = subprocess.Popen([*TOOL, "send", "--bus", bus or self.bus, "--watch", *arguments], stdin=subprocess.PIPE,
                                 stdout=subprocess.PIPE, stderr=subprocess.PIPE)
         watchdog = threading.Timer(PATIENCE, tool.kill)
         watchdog.start()
@@ -85,6 +89,40 @@ class Watch(WithService):
             out, err = tool.communicate(timeout=PATIENCE)
             self.assertEqual((tool.returncode, out), (DONE, b""))
             self.assertEqual(self.kinds(err), ["request", "response", "response", "response", "cancel"])
+
+    def test_signals_end_it_when_nobody_reads_the_output(self):
+        large = ', "title": "%s"' % ("x" * 300_000)  # several times what a pipe holds
+        for number in (signal.SIGINT, signal.SIGTERM):
+            tool = self.watching()
+            tool.stdout.readline()
+            self.service.put(recording(1, large))
+            select.select([tool.stdout], [], [], PATIENCE)
+            time.sleep(0.2)  # the pipe is full by now
+            tool.send_signal(number)
+            self.assertEqual(tool.wait(PATIENCE), SOME_REFUSED)
+            out, err = tool.communicate()
+            self.assertLess(len(out), 300_000)
+            self.assertEqual(err, b"the output could not be written\n")
+            self.service.remove('{"type": "recording", "recordingId": "vuka:rc.1"}')
+
+    def test_signals_end_it_when_nobody_reads_the_trace(self):
+        tool = self.watching("--trace")
+        tool.stdout.readline()
+        self.service.put(recording(1, ', "title": "%s"' % ("x" * 300_000)))
+        time.sleep(0.5)
+        tool.send_signal(signal.SIGTERM)
+        self.assertIn(tool.wait(PATIENCE), (DONE, SOME_REFUSED), "the cancel may come before the response is shown")
+        err = tool.communicate()[1]
+        self.assertLess(len(err), 300_000)
+        self.assertEqual(self.kinds(b"\n".join(err.splitlines()[:2])), ["request", "response"])
+
+    def test_a_message_that_is_not_complete_is_traced_as_such(self):
+        with Relay(self.relay, self.bus, to_client=cut_message):
+            tool = self.watching("--trace", bus=self.relay)
+            self.assertEqual(self.kinds(tool.stderr.readline()), ["request"])
+            self.assertEqual(tool.stderr.readline(), b"the message is not complete\n")
+            tool.kill()
+            tool.communicate()
 
     def test_ends_with_the_connection(self):
         tool = self.watching()
@@ -113,6 +151,39 @@ class PutAndRemove(WithService):
         code, _, err = run("rm", "--bus", self.bus, "--trace", text=recording(1).encode())
         self.assertEqual((code, self.kinds(err)), (DONE, ["request", "response"]))
         self.assertEqual(json.loads(err.splitlines()[0])["headers"], {"Action": "remove"})
+
+    def test_answers_with_other_numbers_are_not_waited_for(self):
+        def renumber(piece):
+            return piece.replace(b"RpcId: 1\r\n", b"RpcId: 9\r\n")
+
+        with Relay(self.relay, self.bus, to_client=renumber, repeat=0.5):
+            lines = recording(1) + "\n" + recording(2)
+            done = subprocess.run([*TOOL, "put", "--bus", self.relay], input=lines.encode(), capture_output=True, timeout=PATIENCE)
+        self.assertEqual((done.returncode, done.stderr), (SOME_REFUSED, b"line 1: timed out; the rest was not sent\n"))
+        self.assertEqual(len(self.service.recordings()), 1)
+
+    def test_a_lost_connection_is_told_once(self):
+        tool = subprocess.Popen([*TOOL, "put", "--bus", self.bus], stdin=subprocess.PIPE, stdout=subprocess.PIPE, stderr=subprocess.PIPE)
+        self.addCleanup(tool.kill)
+        tool.stdin.write(recording(1).encode() + b"\n")
+        tool.stdin.flush()
+        while not self.service.recordings():
+            time.sleep(0.05)
+        self.service.process.kill()
+        self.service.process.wait()
+        _, err = tool.communicate(b"\n".join([recording(2).encode()] * 3000), timeout=PATIENCE)
+        self.assertEqual(tool.returncode, SOME_REFUSED)
+        self.assertRegex(err, b"^line 2: [^\n]*; the rest was not sent\n$")
+
+    def test_words_show_control_characters_and_are_short(self):
+        code, _, err = run("rm", "--bus", self.bus, text='{"type": "recording", "a\x1b[31m\x7f\x9b": "b"}'.encode())
+        self.assertEqual((code, err), (SOME_REFUSED, b"line 1: recording has no field 'a\\u001B[31m\\u007F\\u009B'\n"))
+        code, _, err = run("rm", "--bus", self.bus, text=b'{"type": "recording", "%s": "b"}' % (b"x" * 5000))
+        self.assertEqual((code, err), (SOME_REFUSED, b"line 1: recording has no field '" + b"x" * (1000 - 24) + b"...\n"))
+
+    def test_input_that_cannot_be_read(self):
+        code, _, err = run("put", "--bus", self.bus, "/tmp")
+        self.assertEqual((code, err), (SOME_REFUSED, b"the input: Is a directory\n"))
 
     def test_without_a_service_or_a_file(self):
         code, out, err = run("put", "--bus", self.nowhere, text=recording(1).encode())
