@@ -4,6 +4,7 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <mutex>
 
 #include "rox/RoxAssert.h"
 #include "rox/RoxMempool.h"
@@ -46,10 +47,10 @@ TraceLine::TraceLine(std::string_view message) {
 
 void TraceMessage(bool, const char* bytes, unsigned nBytes) {
     const TraceLine line({bytes, nBytes});
-    ::flockfile(stderr);  // messages of several threads do not mix
+    static std::mutex mutex;  // messages of several threads do not mix
     static bool isWhole = true;
+    const std::lock_guard<std::mutex> lock(mutex);
     if (isWhole) isWhole = WriteUnlessInterrupted(STDERR_FILENO, line.text);
-    ::funlockfile(stderr);
 }
 
 }  // namespace sorn::tools
