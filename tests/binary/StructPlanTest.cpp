@@ -251,4 +251,24 @@ TEST_F(StructPlanTest, FirstUseByManyThreads) {
     for (const std::string& result : results) EXPECT_EQ(result, expected);
 }
 
+/// While an object is written its count changes, beside which some of its numbers stand.
+TEST_F(StructPlanTest, OthersCountWhileItIsWritten) {
+    for (uint32_t id = 0; id < Schema::nStructDefG; ++id) {
+        const StructInfo* const info = Schema::FindStruct(id);
+        if (info == nullptr) continue;
+        const ref<SornObject> object = info->Factory(&pool);
+        for (int slot = 1; slot < info->nFields; ++slot) {
+            const FieldInfo& field = info->vFieldInfo[slot];
+            const bool isReference = StorageOf(field.Type()) == FieldStorage::REFERENCE;
+            if (!field.FHole() && field.presenceOffset != 0 && !isReference) SetPresence(*object, field, 1);
+        }
+        const std::string expected = FieldsOf(object);
+        std::thread counting([object] {
+            for (int i = 0; i < 20; ++i) const ref<SornObject> another = object;
+        });
+        for (int i = 0; i < 5; ++i) EXPECT_EQ(FieldsOf(object), expected) << info->name;
+        counting.join();
+    }
+}
+
 }  // namespace sorntest
